@@ -1,0 +1,39 @@
+#include "entry/app.h"
+
+#include "collect/discovery.h"
+#include "log/log.h"
+
+namespace asum {
+
+COvranticApp& TheApp() {
+  // Leaked on purpose: a destructor that ran at process exit could meet the
+  // thread mid-cycle. Nothing in it needs tearing down.
+  static COvranticApp* app = new COvranticApp;
+  return *app;
+}
+
+void* BEProcessSuccessfulAlerts::GetSuccAlertsInfo() {
+  WriteLog(u"Inside HANDLE BEProcessSuccessfulAlerts::GetSuccAlertsInfo()");
+  std::lock_guard<std::mutex> lock(mutex_);
+  if (m_hThread == nullptr || m_hThread->StopRequested()) {
+    platform::Current().HoldLibraryLoaded();
+    m_hThread = ProcessingThread::Start(kCycleIntervalMs, RunLibraryCycle);
+  }
+  return m_hThread;
+}
+
+bool BEProcessSuccessfulAlerts::StopProcessing(uint32_t ms) {
+  std::lock_guard<std::mutex> lock(mutex_);
+  if (m_hThread == nullptr) return true;
+  m_hThread->RequestStop();
+  return m_hThread->WaitUntilFinished(ms);
+}
+
+void RunLibraryCycle(const platform::StopSignal& stop) {
+  const std::u16string install = InstallFolderOf(platform::Current().ExecutablePath());
+  RunCollectionCycle(install, [&stop](StringList& files, const std::u16string& status, const std::u16string& component) {
+    (void)stop, (void)files, (void)status, (void)component;
+  });
+}
+
+}  // namespace asum

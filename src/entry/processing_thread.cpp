@@ -1,0 +1,36 @@
+#include "entry/processing_thread.h"
+
+#include "log/log.h"
+
+namespace asum {
+
+ProcessingThread::ProcessingThread(uint32_t interval_ms, Cycle cycle)
+    : interval_ms_(interval_ms), cycle_(std::move(cycle)) {}
+
+ProcessingThread* ProcessingThread::Start(uint32_t interval_ms, Cycle cycle) {
+  auto* thread = new ProcessingThread(interval_ms, std::move(cycle));
+  if (!platform::Current().StartThread(&ProcessingThread::Main, thread)) {
+    delete thread;
+    return nullptr;
+  }
+  return thread;
+}
+
+void ProcessingThread::Main(void* self) {
+  auto* thread = static_cast<ProcessingThread*>(self);
+  WriteLog(u"Inside EnableProcessAlertThread(LPVOID lp)");
+  // The first cycle starts one interval after the thread: the host has just
+  // started and its report folders may still be settling.
+  while (!thread->stop_.WaitFor(thread->interval_ms_)) {
+    try {
+      thread->cycle_(thread->stop_);
+    } catch (...) {
+      // A cycle that ran out of memory is abandoned; its files are offered
+      // again in the next one. The thread must outlive any single cycle.
+    }
+    thread->cycles_.fetch_add(1);
+  }
+  thread->finished_.Request();
+}
+
+}  // namespace asum

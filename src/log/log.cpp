@@ -1,0 +1,32 @@
+#include "log/log.h"
+
+#include "common/utf.h"
+#include "platform/platform.h"
+
+namespace asum {
+
+void WriteLog(const std::u16string& message) {
+  try {
+    platform::Env& env = platform::Current();
+    const std::u16string folder = platform::LogFolder();
+    if (!env.PathExists(folder)) return;
+    const std::u16string path = folder + platform::NativeSeparators(u"\\ErrorLog.txt");
+
+    std::u16string timestamp = env.TimestampText(env.LocalNow());
+    if (timestamp.empty()) timestamp = u"Invalid DateTime";
+
+    std::u16string line = timestamp + u'\t';
+    line.reserve(line.size() + message.size() + 2);
+    for (char16_t c : message) {
+      if (c == u'\n') line.push_back(u'\r');
+      line.push_back(c);
+    }
+    line += u"\r\n";
+    env.AppendExclusive(path, Utf16ToLatin1Lossy(line), kLogSizeLimit);
+  } catch (...) {
+    // Out of memory while building the line: the line is dropped, the caller
+    // goes on.
+  }
+}
+
+}  // namespace asum

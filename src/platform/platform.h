@@ -1,0 +1,225 @@
+// The one seam between the library and the operating system.
+//
+// Everything above src/platform/ reaches files, folders, clocks, code pages,
+// settings and threads only through `Env`. Two backends define its methods:
+// win32/ (the Windows facilities) and posix/ (Linux equivalents). Each method is
+// defined in exactly one file of each backend.
+//
+// Paths are UTF-16 texts. The core builds them with `kPathSeparator`; the
+// Windows backend hands them to the wide-character API unchanged, the POSIX
+// backend converts them to UTF-8. On POSIX a backslash is an ordinary character
+// of a name.
+//
+// Thread safety: every method may be called from any thread at once. `Current()`
+// is read without a lock; tests swap it only while no library thread runs.
+//
+// Failure injection: tests derive from `Env`, override the methods whose
+// failure they want to provoke, and install the object with `ScopedEnv`. The
+// base methods are the real ones, so an override can also wrap them.
+#pragma once
+
+#include <cstdint>
+#include <optional>
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace asum::platform {
+
+#ifdef _WIN32
+inline constexpr char16_t kPathSeparator = u'\\';
+#else
+inline constexpr char16_t kPathSeparator = u'/';
+#endif
+
+// Converts the backslashes of a path written the Windows way
+// ("\AlertReports\Outbox") into the separator of this platform. Only for literals of the core,
+// never for texts that came from outside.
+std::u16string NativeSeparators(std::u16string path);
+
+// A calendar time in the layout of the Windows SYSTEMTIME record.
+struct SystemTime {
+  uint16_t year = 0;
+  uint16_t month = 0;
+  uint16_t day_of_week = 0;
+  uint16_t day = 0;
+  uint16_t hour = 0;
+  uint16_t minute = 0;
+  uint16_t second = 0;
+  uint16_t milliseconds = 0;
+  bool operator==(const SystemTime&) const = default;
+};
+
+struct DirEntry {
+  std::u16string name;       // last path element
+  std::u16string full_path;  // folder, separator, name
+  bool is_folder = false;
+};
+
+// The outcome of a file operation, classified where the caller decides on it.
+enum class FileStatus {
+  kOk,
+  kNotFound,
+  kAlreadyExists,
+  kAccessDenied,
+  kSharingViolation,  // another opener holds the file (Windows share modes)
+  kDiskFull,
+  kTooLarge,          // more bytes than the caller allowed
+  kIsFolder,
+  kOther,
+};
+
+struct FileResult {
+  FileStatus status = FileStatus::kOk;
+  uint32_t os_error = 0;  // GetLastError() or errno; 0 when not from the OS
+  bool ok() const { return status == FileStatus::kOk; }
+  // For log lines: the status in words and the OS code, e.g. "access denied (5)".
+  std::u16string Describe() const;
+};
+
+// An opened settings key (a registry key on Windows, a folder on POSIX). Null
+// means "none".
+using SettingsKey = void*;
+
+class Env {
+ public:
+  Env() = default;
+  Env(const Env&) = delete;
+  Env& operator=(const Env&) = delete;
+  virtual ~Env() = default;
+
+  // The real backend. Never destroyed, so it may be used during process exit.
+  static Env& Default();
+
+  // --- Host process -------------------------------------------------------
+  // Full path of the host executable (not of this library). On Windows read
+  // with GetModuleFileNameW(NULL) into 1000 characters, so a longer path comes
+  // back cut; on Linux from /proc/self/exe.
+  virtual std::u16string ExecutablePath();
+
+  // --- Files and folders --------------------------------------------------
+  // True when the path names a file or a folder.
+  virtual bool PathExists(const std::u16string& path);
+  // Lists the entries of `folder` whose names match `wildcard` ('*' and '?',
+  // ASCII letter case ignored, "*.*" matches every name, as the Windows
+  // directory search does), skipping "." and "..". Returns false when the
+  // search cannot start (missing folder, no permission); `out` is then empty.
+  virtual bool ListFolder(const std::u16string& folder, const std::u16string& wildcard,
+                          std::vector<DirEntry>* out);
+  // One level; fails when the folder exists.
+  virtual FileResult CreateFolder(const std::u16string& path);
+  // Renames without replacing: an existing target gives kAlreadyExists.
+  virtual FileResult MoveFile(const std::u16string& from, const std::u16string& to);
+  virtual FileResult DeleteFile(const std::u16string& path);
+  // Reads a whole file. On Windows the file is opened with FILE_SHARE_READ only,
+  // so a file that a writer still holds open fails with kSharingViolation and is
+  // read in a later cycle. POSIX has no share modes: a file being written is
+  // read as far as it is written. More than `max_bytes` gives kTooLarge.
+  virtual FileResult ReadFile(const std::u16string& path, std::string* bytes, uint64_t max_bytes);
+  // Writes `bytes` into a new file, replacing an old one (tests and tools).
+  virtual FileResult WriteFile(const std::u16string& path, std::string_view bytes);
+
+  // The diagnostic log's write: opens `path` for exclusive use (creating it
+  // when missing), empties it first when it holds `size_limit` bytes or more,
+  // appends `line` and closes it. Returns false, writing nothing, when another
+  // writer holds the file or it cannot be opened. On POSIX the exclusion is a
+  // non-blocking flock, and a symbolic link is never followed.
+  virtual bool AppendExclusive(const std::u16string& path, std::string_view line,
+                               uint64_t size_limit);
+
+  // --- Clocks and time zone ----------------------------------------------
+  virtual SystemTime LocalNow();
+  virtual SystemTime UtcNow();
+  // The machine's current offset as Windows states it: minutes to add to local
+  // time to get UTC (positive west of Greenwich), daylight bias included while
+  // daylight time is in effect.
+  virtual int32_t CurrentBiasMinutes();
+  // UTC to local time with the machine's current rules. Empty when the time
+  // cannot be converted.
+  virtual std::optional<SystemTime> UtcToLocal(const SystemTime& utc);
+  // The log's timestamp for a local time: the user's short date, a blank and
+  // the time with seconds. Empty when the time cannot be rendered.
+  virtual std::u16string TimestampText(const SystemTime& local);
+  // OLE Automation dates (days since 1899-12-30, time as the fraction).
+  virtual std::optional<double> SystemTimeToVariantTime(const SystemTime& st);
+  virtual std::optional<SystemTime> VariantTimeToSystemTime(double date);
+
+  // --- Code pages ---------------------------------------------------------
+  // Decodes 8-bit text of a Windows code page number (1252, 65001, 932, ...).
+  // Empty when this machine cannot convert that code page.
+  virtual std::optional<std::u16string> DecodeCodePage(uint32_t code_page, std::string_view bytes);
+  // The system's ANSI code page (GetACP on Windows, 1252 on POSIX).
+  virtual uint32_t AnsiCodePage();
+
+  // --- Settings (HKEY_LOCAL_MACHINE) ------------------------------------------
+  // The root key HKEY_LOCAL_MACHINE. Never closed.
+  static SettingsKey LocalMachine();
+  // RegOpenKeyExW with KEY_READ | KEY_WRITE; null when the key is missing or
+  // access is refused.
+  virtual SettingsKey OpenKey(SettingsKey parent, const std::u16string& name);
+  // RegCreateKeyExW (non-volatile, KEY_READ | KEY_WRITE): opens or creates.
+  virtual SettingsKey CreateKey(SettingsKey parent, const std::u16string& name);
+  // The value's bytes read as UTF-16 text whatever its type, ending at its first
+  // zero character. Empty when the value is missing or unreadable.
+  virtual std::optional<std::u16string> QueryStringValue(SettingsKey key, const std::u16string& name);
+  virtual void CloseKey(SettingsKey key);
+
+  // --- Threads ------------------------------------------------------------
+  // Starts a detached thread running fn(arg). Returns false when none started.
+  // Nothing ever joins it.
+  virtual bool StartThread(void (*fn)(void*), void* arg);
+  // Keeps this library mapped until the process ends (Windows: the module is
+  // pinned, so FreeLibrary cannot unmap code a running thread executes). POSIX
+  // stops the thread at unload instead and does nothing here.
+  virtual bool HoldLibraryLoaded();
+};
+
+// The environment the library uses now (Env::Default() unless a test replaced it).
+Env& Current();
+
+// Installs another environment for the lifetime of the object (tests only).
+class ScopedEnv {
+ public:
+  explicit ScopedEnv(Env* env);
+  ~ScopedEnv();
+  ScopedEnv(const ScopedEnv&) = delete;
+  ScopedEnv& operator=(const ScopedEnv&) = delete;
+
+ private:
+  Env* previous_;
+};
+
+// Process-wide locations that the library takes as fixed but that tests and
+// the command-line tool point elsewhere. Set them before starting any thread.
+//
+// The diagnostic log folder: "C:\AlertSummaryDbg" on Windows,
+// "/var/log/AlertSummaryDbg" on Linux.
+std::u16string LogFolder();
+void SetLogFolder(std::u16string folder);
+// POSIX only: the folder that stands for HKEY_LOCAL_MACHINE (each key a folder,
+// each string value a file of UTF-8 text). Default
+// "/etc/AlertSummary/registry/HKEY_LOCAL_MACHINE".
+std::u16string SettingsRoot();
+void SetSettingsRoot(std::u16string folder);
+
+// A stop request that a sleeping thread can wait on. Safe from any thread;
+// never destroyed while a thread may wait on it (callers leak it on purpose).
+class StopSignal {
+ public:
+  StopSignal();
+  ~StopSignal();
+  StopSignal(const StopSignal&) = delete;
+  StopSignal& operator=(const StopSignal&) = delete;
+
+  void Request();
+  bool Requested() const;
+  // Sleeps up to `ms` milliseconds; returns true at once when a stop is (or
+  // becomes) requested.
+  bool WaitFor(uint32_t ms);
+
+ private:
+  struct Impl;
+  Impl* impl_;
+};
+
+}  // namespace asum::platform

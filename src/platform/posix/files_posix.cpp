@@ -1,0 +1,190 @@
+#include <dirent.h>
+#include <fcntl.h>
+#include <stdio.h>
+#include <sys/file.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <cstring>
+
+#include "platform/posix/posix_util.h"
+
+namespace asum::platform {
+
+using posix::FromErrno;
+using posix::FromNative;
+using posix::ToNative;
+
+namespace {
+
+char16_t FoldAscii(char16_t c) { return (c >= u'A' && c <= u'Z') ? static_cast<char16_t>(c + 32) : c; }
+
+// '*' and '?' over UTF-16 code units, ASCII case ignored, iterative with one
+// back-tracking point so a hostile pattern cannot take exponential time.
+bool WildcardMatch(std::u16string_view pattern, std::u16string_view name) {
+  if (pattern == u"*.*" || pattern == u"*") return true;
+  size_t p = 0, n = 0, star = std::u16string_view::npos, mark = 0;
+  while (n < name.size()) {
+    if (p < pattern.size() && (pattern[p] == u'?' || FoldAscii(pattern[p]) == FoldAscii(name[n]))) {
+      ++p, ++n;
+    } else if (p < pattern.size() && pattern[p] == u'*') {
+      star = p++;
+      mark = n;
+    } else if (star != std::u16string_view::npos) {
+      p = star + 1;
+      n = ++mark;
+    } else {
+      return false;
+    }
+  }
+  while (p < pattern.size() && pattern[p] == u'*') ++p;
+  return p == pattern.size();
+}
+
+bool WriteAll(int fd, std::string_view bytes) {
+  while (!bytes.empty()) {
+    const ssize_t n = ::write(fd, bytes.data(), bytes.size());
+    if (n < 0) {
+      if (errno == EINTR) continue;
+      return false;
+    }
+    bytes.remove_prefix(static_cast<size_t>(n));
+  }
+  return true;
+}
+
+}  // namespace
+
+bool Env::PathExists(const std::u16string& path) {
+  struct stat st;
+  return !path.empty() && ::stat(ToNative(path).c_str(), &st) == 0;
+}
+
+bool Env::ListFolder(const std::u16string& folder, const std::u16string& wildcard,
+                     std::vector<DirEntry>* out) {
+  out->clear();
+  const std::string native = ToNative(folder);
+  DIR* dir = ::opendir(native.empty() ? "." : native.c_str());
+  if (dir == nullptr) return false;
+  std::u16string prefix = folder;
+  if (!prefix.empty() && prefix.back() != kPathSeparator) prefix.push_back(kPathSeparator);
+  while (struct dirent* ent = ::readdir(dir)) {
+    if (std::strcmp(ent->d_name, ".") == 0 || std::strcmp(ent->d_name, "..") == 0) continue;
+    DirEntry entry;
+    entry.name = FromNative(ent->d_name);
+    if (!WildcardMatch(wildcard, entry.name)) continue;
+    entry.full_path = prefix + entry.name;
+    struct stat st;
+    const std::string child = native + "/" + ent->d_name;
+    entry.is_folder = ::stat(child.c_str(), &st) == 0 && S_ISDIR(st.st_mode);
+    out->push_back(std::move(entry));
+  }
+  ::closedir(dir);
+  return true;
+}
+
+FileResult Env::CreateFolder(const std::u16string& path) {
+  if (::mkdir(ToNative(path).c_str(), 0755) == 0) return {};
+  return FromErrno(errno);
+}
+
+FileResult Env::MoveFile(const std::u16string& from, const std::u16string& to) {
+  // link + unlink refuses an existing target atomically, as MoveFileW does;
+  // renameat2(RENAME_NOREPLACE) is not available on every file system.
+  const std::string src = ToNative(from), dst = ToNative(to);
+  if (::link(src.c_str(), dst.c_str()) == 0) {
+    if (::unlink(src.c_str()) == 0) return {};
+    const int err = errno;
+    ::unlink(dst.c_str());
+    return FromErrno(err);
+  }
+  const int err = errno;
+  if (err == EEXIST) return FromErrno(err);
+  // File systems without hard links: fall back to a checked rename.
+  if (err == EPERM || err == EXDEV || err == EOPNOTSUPP || err == EMLINK) {
+    struct stat st;
+    if (::lstat(dst.c_str(), &st) == 0) return FromErrno(EEXIST);
+    if (::rename(src.c_str(), dst.c_str()) == 0) return {};
+    return FromErrno(errno);
+  }
+  return FromErrno(err);
+}
+
+FileResult Env::DeleteFile(const std::u16string& path) {
+  if (::unlink(ToNative(path).c_str()) == 0) return {};
+  return FromErrno(errno);
+}
+
+FileResult Env::ReadFile(const std::u16string& path, std::string* bytes, uint64_t max_bytes) {
+  bytes->clear();
+  const int fd = ::open(ToNative(path).c_str(), O_RDONLY | O_CLOEXEC);
+  if (fd < 0) return FromErrno(errno);
+  struct stat st;
+  if (::fstat(fd, &st) != 0) {
+    const int err = errno;
+    ::close(fd);
+    return FromErrno(err);
+  }
+  if (S_ISDIR(st.st_mode)) {
+    ::close(fd);
+    return {FileStatus::kIsFolder, EISDIR};
+  }
+  if (static_cast<uint64_t>(st.st_size) > max_bytes) {
+    ::close(fd);
+    return {FileStatus::kTooLarge, 0};
+  }
+  try {
+    bytes->reserve(static_cast<size_t>(st.st_size));
+  } catch (...) {
+    ::close(fd);
+    return {FileStatus::kTooLarge, ENOMEM};
+  }
+  char buffer[65536];
+  for (;;) {
+    const ssize_t n = ::read(fd, buffer, sizeof buffer);
+    if (n < 0) {
+      if (errno == EINTR) continue;
+      const int err = errno;
+      ::close(fd);
+      bytes->clear();
+      return FromErrno(err);
+    }
+    if (n == 0) break;
+    if (bytes->size() + static_cast<size_t>(n) > max_bytes) {
+      ::close(fd);
+      bytes->clear();
+      return {FileStatus::kTooLarge, 0};
+    }
+    bytes->append(buffer, static_cast<size_t>(n));
+  }
+  ::close(fd);
+  return {};
+}
+
+FileResult Env::WriteFile(const std::u16string& path, std::string_view bytes) {
+  const int fd = ::open(ToNative(path).c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0644);
+  if (fd < 0) return FromErrno(errno);
+  const bool ok = WriteAll(fd, bytes);
+  const int err = errno;
+  if (::close(fd) != 0 || !ok) return FromErrno(ok ? errno : err);
+  return {};
+}
+
+bool Env::AppendExclusive(const std::u16string& path, std::string_view line, uint64_t size_limit) {
+  const int fd = ::open(ToNative(path).c_str(), O_RDWR | O_CREAT | O_NOFOLLOW | O_CLOEXEC, 0644);
+  if (fd < 0) return false;
+  // Windows opens the log with share mode 0; a writer that finds it held drops
+  // its line instead of waiting, and so do we.
+  if (::flock(fd, LOCK_EX | LOCK_NB) != 0) {
+    ::close(fd);
+    return false;
+  }
+  struct stat st;
+  bool ok = ::fstat(fd, &st) == 0 && S_ISREG(st.st_mode);
+  if (ok && static_cast<uint64_t>(st.st_size) >= size_limit) ok = ::ftruncate(fd, 0) == 0;
+  if (ok) ok = ::lseek(fd, 0, SEEK_END) >= 0 && WriteAll(fd, line);
+  ::close(fd);  // also releases the lock
+  return ok;
+}
+
+}  // namespace asum::platform

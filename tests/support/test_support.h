@@ -1,0 +1,55 @@
+// Helpers shared by the test programs: temporary folders, files, and a log
+// folder of the test's own.
+#pragma once
+
+#include <string>
+#include <vector>
+
+#include "platform/platform.h"
+
+namespace asum::test {
+
+// A fresh folder under the system's temporary folder, removed with everything
+// in it when the object goes. Paths use the platform's separator.
+class TempDir {
+ public:
+  TempDir();
+  ~TempDir();
+  TempDir(const TempDir&) = delete;
+  TempDir& operator=(const TempDir&) = delete;
+
+  const std::u16string& path() const { return path_; }
+  // path() + separator + relative (relative may use '\' between elements).
+  std::u16string Join(const std::u16string& relative) const;
+
+ private:
+  std::u16string path_;
+};
+
+// Creates every missing folder of `path`.
+void MakeFolders(const std::u16string& path);
+// Writes a file (creating its folders); fails the current test on error.
+void WriteText(const std::u16string& path, const std::string& bytes);
+std::string ReadText(const std::u16string& path);
+void RemoveTree(const std::u16string& path);
+// Names in a folder, sorted.
+std::vector<std::u16string> ListNames(const std::u16string& folder);
+
+// Points the diagnostic log at a temporary folder for the object's lifetime.
+class CapturedLog {
+ public:
+  CapturedLog();
+  ~CapturedLog();
+  // The messages written so far, without timestamps, in order.
+  std::vector<std::u16string> Messages() const;
+  std::u16string folder() const { return dir_.path(); }
+
+ private:
+  TempDir dir_;
+  std::u16string previous_;
+};
+
+std::string Narrow(const std::u16string& text);  // UTF-8, for messages
+std::u16string U16(const std::string& utf8);
+
+}  // namespace asum::test
