@@ -1,6 +1,6 @@
-#include <oleauto.h>
-
 #include "platform/win32/win32_util.h"
+
+#include <oleauto.h>
 
 namespace asum::platform {
 
