@@ -1,0 +1,31 @@
+#!/usr/bin/env bash
+# Sets up the machine, builds the Linux and Windows builds and runs every test.
+#   scripts/test.sh            everything
+#   SKIP_SETUP=1 scripts/test.sh   without the package check
+set -euo pipefail
+cd "$(dirname "$0")/.."
+root=$(pwd)
+
+[[ "${SKIP_SETUP:-0}" == 1 ]] || scripts/setup.sh
+
+jobs=$(nproc)
+export CTEST_OUTPUT_ON_FAILURE=1
+
+step() { printf '\n=== %s\n' "$*"; }
+
+step "Linux build"
+cmake -S . -B build/linux -G Ninja -DCMAKE_BUILD_TYPE=RelWithDebInfo >/dev/null
+cmake --build build/linux -j"$jobs"
+step "Linux tests"
+(cd build/linux && ctest -j"$jobs" --timeout 300)
+
+step "Windows x64 build"
+cmake -S . -B build/win64 -G Ninja -DCMAKE_TOOLCHAIN_FILE=cmake/mingw-w64-x86_64.cmake >/dev/null
+cmake --build build/win64 -j"$jobs"
+step "Windows x64 tests (Wine)"
+# shellcheck source=../.ci/wine-env.sh
+source .ci/wine-env.sh
+trap wine_stop EXIT
+(cd build/win64 && ctest -j"$jobs" --timeout 300)
+
+step "All builds green"
