@@ -1,0 +1,22 @@
+// Maps the charset names that messages declare to Windows code page numbers,
+// the form in which the platform layer converts 8-bit text.
+//
+// Pure and thread-safe. An unknown, garbled or empty name gives no code page;
+// the caller then falls back to its own rule and never to an empty text.
+#pragma once
+
+#include <cstdint>
+#include <optional>
+#include <string_view>
+
+namespace asum::mail {
+
+inline constexpr uint32_t kCodePageUtf8 = 65001;
+inline constexpr uint32_t kCodePageAscii = 20127;
+inline constexpr uint32_t kCodePageIso2022Jp = 50220;
+
+// Letter case, blanks, '-', '_' and surrounding quotes are ignored, so
+// "ISO_8859-1", "iso8859-1" and "Latin1" all name code page 28591.
+std::optional<uint32_t> CodePageForCharset(std::string_view name);
+
+}  // namespace asum::mail
