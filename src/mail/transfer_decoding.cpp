@@ -23,6 +23,16 @@ int HexValue(char c) {
   return -1;
 }
 
+// A cut group still yields its whole bytes (the padding case).
+void FlushPartial(uint32_t bits, int count, std::string* out) {
+  if (count == 2) {
+    out->push_back(static_cast<char>((bits >> 4) & 0xFF));
+  } else if (count == 3) {
+    out->push_back(static_cast<char>((bits >> 10) & 0xFF));
+    out->push_back(static_cast<char>((bits >> 2) & 0xFF));
+  }
+}
+
 }  // namespace
 
 std::string DecodeBase64(std::string_view text) {
@@ -35,6 +45,7 @@ std::string DecodeBase64(std::string_view text) {
     // Padding ends a group; writers that join several encoded blocks put
     // more data after it, so decoding goes on with a fresh group.
     if (ch == '=') {
+      FlushPartial(bits, count, &out);
       bits = 0;
       count = 0;
       continue;
@@ -49,13 +60,7 @@ std::string DecodeBase64(std::string_view text) {
       count = 0;
     }
   }
-  // A cut group still yields its whole bytes (the padding case).
-  if (count == 2) {
-    out.push_back(static_cast<char>((bits >> 4) & 0xFF));
-  } else if (count == 3) {
-    out.push_back(static_cast<char>((bits >> 10) & 0xFF));
-    out.push_back(static_cast<char>((bits >> 2) & 0xFF));
-  }
+  FlushPartial(bits, count, &out);
   return out;
 }
 
