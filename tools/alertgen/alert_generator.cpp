@@ -1,5 +1,6 @@
 #include "alert_generator.h"
 
+#include <algorithm>
 #include <cstdio>
 #include <random>
 #include <vector>
@@ -15,7 +16,7 @@ const char* const kObjects[] = {"\\\\FS01\\Finance\\Q3 budget.xlsx", "\\\\FS02\\
                                 "CN=Domain Admins,CN=Users,DC=corp,DC=local", "\\\\FS01\\Legal\\Contracts",
                                 "OU=Workstations,DC=corp,DC=local", "dbo.Customers"};
 
-std::string Base64(const std::string& in) {
+std::string Base64(const std::string& in, bool wrap = true) {
   static const char* t = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/";
   std::string out;
   size_t line = 0;
@@ -27,12 +28,12 @@ std::string Base64(const std::string& in) {
     out += t[(n >> 12) & 63];
     out += i + 1 < in.size() ? t[(n >> 6) & 63] : '=';
     out += i + 2 < in.size() ? t[n & 63] : '=';
-    if ((line += 4) >= 76) {
+    if (wrap && (line += 4) >= 76) {
       out += "\r\n";
       line = 0;
     }
   }
-  return out + "\r\n";
+  return wrap ? out + "\r\n" : out;
 }
 
 std::string QuotedPrintable(const std::string& in) {
@@ -109,10 +110,32 @@ std::string DateHeader(std::mt19937& rng, uint32_t index) {
 
 // Subject encodings: plain, RFC 2047 base64 in UTF-8, quoted-printable in Latin-1.
 std::string EncodeSubject(const std::string& utf8, uint32_t index) {
-  if (index % 5 == 1) return "=?UTF-8?B?" + Base64(utf8).substr(0, Base64(utf8).size() - 2) + "?=";
+  if (index % 5 == 1) {
+    // Words of at most 45 bytes, never splitting a character, on folded lines.
+    std::string out;
+    size_t pos = 0;
+    while (pos < utf8.size()) {
+      size_t end = std::min(utf8.size(), pos + 45);
+      while (end < utf8.size() && (static_cast<unsigned char>(utf8[end]) & 0xC0) == 0x80) --end;
+      if (!out.empty()) out += "\r\n ";
+      out += "=?UTF-8?B?" + Base64(utf8.substr(pos, end - pos), false) + "?=";
+      pos = end;
+    }
+    return out;
+  }
   if (index % 5 == 3) {
+    // Latin-1 bytes: the generated texts use no character beyond U+00FF.
+    std::string latin1;
+    for (size_t i = 0; i < utf8.size(); ++i) {
+      const auto c = static_cast<unsigned char>(utf8[i]);
+      if ((c == 0xC2 || c == 0xC3) && i + 1 < utf8.size()) {
+        latin1 += static_cast<char>(((c & 0x03) << 6) | (static_cast<unsigned char>(utf8[++i]) & 0x3F));
+      } else {
+        latin1 += static_cast<char>(c);
+      }
+    }
     std::string q;
-    for (unsigned char c : utf8) {
+    for (unsigned char c : latin1) {
       if (c == ' ') {
         q += '_';
       } else if (c >= 33 && c <= 126 && c != '?' && c != '=' && c != '_' && c != '"') {
@@ -135,12 +158,15 @@ int RowsForSize(size_t bytes) { return bytes < 3000 ? 1 : static_cast<int>((byte
 GeneratedAlert GenerateAlert(uint32_t seed, uint32_t index, int rows, bool predefined_folder) {
   std::mt19937 rng(seed * 7919u + index);
   GeneratedAlert alert;
-  const uint32_t variant = index / 2;
+  // Callers often place files round-robin over a few folders; mixing the
+  // index keeps every folder from getting one kind and one encoding only.
+  const uint32_t mix = index + index / 6 + index / 36;
+  const uint32_t variant = mix / 2;
   if (predefined_folder) {
-    alert.kind = index % 3 == 2 ? AlertKind::kDataLeakage : AlertKind::kPredefined;
+    alert.kind = mix % 3 == 2 ? AlertKind::kDataLeakage : AlertKind::kPredefined;
   } else {
     static const AlertKind kinds[] = {AlertKind::kThreshold, AlertKind::kEmail, AlertKind::kScript};
-    alert.kind = kinds[index % 3];
+    alert.kind = kinds[mix % 3];
   }
   const std::string server = kServers[rng() % 7];
   std::string subject, html, plain;
@@ -206,18 +232,18 @@ GeneratedAlert GenerateAlert(uint32_t seed, uint32_t index, int rows, bool prede
       break;
     }
   }
-  if (variant % 4 == 3) subject += " \xE2\x80\x93 r\xC3\xA9sum\xC3\xA9";  // non-ASCII text in the subject
+  if (variant % 4 == 3) subject += " r\xC3\xA9sum\xC3\xA9";  // non-ASCII text in the subject
   plain = "This alert is best read as HTML.\r\n" + subject + "\r\n";
 
   std::string m;
   m += "From: \"Alert Service\" <alerts@corp.example>\r\n";
   m += "To: security-team@corp.example\r\n";
-  m += "Subject: " + EncodeSubject(subject, index) + "\r\n";
+  m += "Subject: " + EncodeSubject(subject, mix) + "\r\n";
   m += "Date: " + DateHeader(rng, index) + "\r\n";
   m += "Message-ID: <" + std::to_string(seed) + "." + std::to_string(index) + "@corp.example>\r\n";
   m += "MIME-Version: 1.0\r\n";
   const std::string boundary = "----=_NextPart_" + std::to_string(seed) + "_" + std::to_string(index);
-  switch (index % 4) {
+  switch (mix % 4) {
     case 0:  // HTML only, quoted-printable
       m += "Content-Type: text/html; charset=\"utf-8\"\r\nContent-Transfer-Encoding: quoted-printable\r\n\r\n";
       m += QuotedPrintable(html);
@@ -228,7 +254,7 @@ GeneratedAlert GenerateAlert(uint32_t seed, uint32_t index, int rows, bool prede
       m += "This is a multi-part message in MIME format.\r\n\r\n--" + boundary + "\r\n";
       m += "Content-Type: text/plain; charset=\"utf-8\"\r\nContent-Transfer-Encoding: 7bit\r\n\r\n" + plain + "\r\n";
       m += "--" + boundary + "\r\nContent-Type: text/html; charset=\"utf-8\"\r\n";
-      if (index % 4 == 1) {
+      if (mix % 4 == 1) {
         m += "Content-Transfer-Encoding: base64\r\n\r\n" + Base64(html);
       } else {
         m += "Content-Transfer-Encoding: quoted-printable\r\n\r\n" + QuotedPrintable(html);
