@@ -27,18 +27,6 @@ TEST(TextOps, CutsClampAtBothEnds) {
   }
 }
 
-TEST(TextOps, SearchesAreExactAndCountNul) {
-  const std::u16string with_nul(u"a\0b;b", 5);
-  EXPECT_EQ(Find(u"Who who", u"who"), 4);
-  EXPECT_EQ(Find(u"abc", u"C"), -1);
-  EXPECT_EQ(Find(u"ab", u"abc"), -1);
-  EXPECT_EQ(Find(u"abc", u""), 0);
-  EXPECT_EQ(Find(with_nul, u"b;"), 2);  // a NUL does not end the text
-  EXPECT_EQ(ReverseFind(u"a\\b\\c", u'\\'), 3);
-  EXPECT_EQ(ReverseFind(u"abc", u'\\'), -1);
-  EXPECT_EQ(ReverseFind(u"", u'x'), -1);
-}
-
 TEST(TextOps, ReplaceScansLeftToRightOnce) {
   struct Case { std::u16string_view text, old_text, new_text, want; };
   const Case cases[] = {
