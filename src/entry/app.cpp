@@ -1,6 +1,7 @@
 #include "entry/app.h"
 
-#include "collect/discovery.h"
+#include "collect/cycle.h"
+#include "collect/process_alerts.h"
 #include "log/log.h"
 
 namespace asum {
@@ -29,10 +30,17 @@ bool BEProcessSuccessfulAlerts::StopProcessing(uint32_t ms) {
   return m_hThread->WaitUntilFinished(ms);
 }
 
+void BEProcessSuccessfulAlerts::ProcessAlertFiles(StringList* strListofFilePaths, std::u16string strEmailStatus,
+                                                  std::u16string strComponentFolder) {
+  if (strListofFilePaths == nullptr) return;
+  asum::ProcessAlertFiles(InstallFolderOf(platform::Current().ExecutablePath()), *strListofFilePaths, strEmailStatus,
+                          strComponentFolder);
+}
+
 void RunLibraryCycle(const platform::StopSignal& stop) {
   const std::u16string install = InstallFolderOf(platform::Current().ExecutablePath());
-  RunCollectionCycle(install, [&stop](StringList& files, const std::u16string& status, const std::u16string& component) {
-    (void)stop, (void)files, (void)status, (void)component;
+  RunLockedCycle(install, [&](StringList& files, const std::u16string& status, const std::u16string& component) {
+    ProcessAlertFiles(install, files, status, component, &stop);
   });
 }
 

@@ -8,6 +8,7 @@
 
 #include <mutex>
 
+#include "collect/discovery.h"
 #include "entry/processing_thread.h"
 
 namespace asum {
@@ -23,6 +24,11 @@ class BEProcessSuccessfulAlerts {
   // Asks a running thread to stop and waits up to `ms` for its current cycle
   // to end. True when no thread runs any more.
   bool StopProcessing(uint32_t ms);
+
+  // Processes one report folder's alert files into the database beside the
+  // host executable.
+  void ProcessAlertFiles(StringList* strListofFilePaths, std::u16string strEmailStatus,
+                         std::u16string strComponentFolder);
 
  private:
   std::mutex mutex_;

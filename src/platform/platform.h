@@ -77,6 +77,9 @@ struct FileResult {
   std::u16string Describe() const;
 };
 
+// A held file lock; null means none.
+using FileLock = void*;
+
 // An opened settings key (a registry key on Windows, a folder on POSIX). Null
 // means "none".
 using SettingsKey = void*;
@@ -127,6 +130,12 @@ class Env {
   virtual bool AppendExclusive(const std::u16string& path, std::string_view line,
                                uint64_t size_limit);
 
+  // Creates `path` when missing and locks it for this holder alone, without
+  // waiting (LockFileEx on Windows, flock on POSIX). Null when another holder
+  // has it, or when the file cannot be opened (access denied counts as held).
+  virtual FileLock TryLockFile(const std::u16string& path);
+  virtual void UnlockFile(FileLock lock);
+
   // --- Clocks and time zone ----------------------------------------------
   virtual SystemTime LocalNow();
   virtual SystemTime UtcNow();
@@ -173,6 +182,9 @@ class Env {
   // stops the thread at unload instead and does nothing here.
   virtual bool HoldLibraryLoaded();
 };
+
+// True when the process's standard error is a terminal (for progress bars).
+bool StderrIsTerminal();
 
 // The environment the library uses now (Env::Default() unless a test replaced it).
 Env& Current();

@@ -187,4 +187,21 @@ bool Env::AppendExclusive(const std::u16string& path, std::string_view line, uin
   return ok;
 }
 
+FileLock Env::TryLockFile(const std::u16string& path) {
+  const int fd = ::open(ToNative(path).c_str(), O_RDWR | O_CREAT | O_NOFOLLOW | O_CLOEXEC, 0644);
+  if (fd < 0) return nullptr;
+  if (::flock(fd, LOCK_EX | LOCK_NB) != 0) {
+    ::close(fd);
+    return nullptr;
+  }
+  return new int(fd);
+}
+
+void Env::UnlockFile(FileLock lock) {
+  if (lock == nullptr) return;
+  int* fd = static_cast<int*>(lock);
+  ::close(*fd);  // releases the lock
+  delete fd;
+}
+
 }  // namespace asum::platform

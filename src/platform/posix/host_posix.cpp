@@ -56,4 +56,6 @@ bool Env::StartThread(void (*fn)(void*), void* arg) {
 
 bool Env::HoldLibraryLoaded() { return true; }
 
+bool StderrIsTerminal() { return ::isatty(2) == 1; }
+
 }  // namespace asum::platform

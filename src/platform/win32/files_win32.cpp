@@ -138,4 +138,23 @@ bool Env::AppendExclusive(const std::u16string& path, std::string_view line, uin
   return ok;
 }
 
+FileLock Env::TryLockFile(const std::u16string& path) {
+  HANDLE file = ::CreateFileW(W(path), GENERIC_READ | GENERIC_WRITE, FILE_SHARE_READ | FILE_SHARE_WRITE | FILE_SHARE_DELETE,
+                              nullptr, OPEN_ALWAYS, FILE_ATTRIBUTE_NORMAL, nullptr);
+  if (file == INVALID_HANDLE_VALUE) return nullptr;
+  OVERLAPPED at = {};
+  if (!::LockFileEx(file, LOCKFILE_EXCLUSIVE_LOCK | LOCKFILE_FAIL_IMMEDIATELY, 0, 1, 0, &at)) {
+    ::CloseHandle(file);
+    return nullptr;
+  }
+  return file;
+}
+
+void Env::UnlockFile(FileLock lock) {
+  if (lock == nullptr) return;
+  OVERLAPPED at = {};
+  ::UnlockFileEx(static_cast<HANDLE>(lock), 0, 1, 0, &at);
+  ::CloseHandle(static_cast<HANDLE>(lock));
+}
+
 }  // namespace asum::platform

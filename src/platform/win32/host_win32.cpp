@@ -45,6 +45,11 @@ bool Env::StartThread(void (*fn)(void*), void* arg) {
   return true;
 }
 
+bool StderrIsTerminal() {
+  DWORD mode = 0;
+  return ::GetConsoleMode(::GetStdHandle(STD_ERROR_HANDLE), &mode) != 0;
+}
+
 namespace {
 const char kModuleAnchor = 0;  // any address inside this module
 }  // namespace

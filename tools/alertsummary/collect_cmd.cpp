@@ -1,0 +1,102 @@
+#include <chrono>
+#include <cstdio>
+#include <memory>
+#include <thread>
+
+#include "collect/cycle.h"
+#include "collect/process_alerts.h"
+#include "commands.h"
+#include "platform/platform.h"
+
+namespace asum::tool {
+namespace {
+
+struct CollectOptions {
+  CommonOptions common;
+  bool once = false;
+  double interval = 10;
+};
+
+// A bar on stderr while a long backlog is worked through; only on a terminal,
+// so piped output stays clean.
+class Progress {
+ public:
+  explicit Progress(uint64_t total) : total_(total), enabled_(total > 0 && platform::StderrIsTerminal()) {}
+  void Advance(uint64_t done) {
+    if (!enabled_) return;
+    const int width = 40;
+    const int filled = static_cast<int>(width * done / total_);
+    std::fprintf(stderr, "\r[%.*s%*s] %llu/%llu files", filled, "########################################",
+                 width - filled, "", static_cast<unsigned long long>(done), static_cast<unsigned long long>(total_));
+    std::fflush(stderr);
+  }
+  ~Progress() {
+    if (enabled_) std::fprintf(stderr, "\n");
+  }
+
+ private:
+  uint64_t total_;
+  bool enabled_;
+};
+
+uint64_t Backlog(const std::u16string& install) {
+  uint64_t total = 0;
+  RunCollectionCycle(install, [&](StringList& files, const std::u16string&, const std::u16string&) {
+    total += files.size();
+  });
+  return total;
+}
+
+int RunOnce(const std::u16string& install, bool first_creates) {
+  if (first_creates) EnsureDatabase(install);
+  Progress progress(Backlog(install));
+  ProcessTally tally;
+  const CycleResult result = RunLockedCycle(install, [&](StringList& files, const std::u16string& status,
+                                                           const std::u16string& component) {
+    ProcessAlertFiles(install, files, status, component, nullptr, &tally);
+    progress.Advance(tally.stored + tally.marked + tally.left);
+  });
+  if (result == CycleResult::kBusy) {
+    std::fprintf(stderr, "alertsummary: another collector (the service or another tool) is working on %s; "
+                         "nothing was done\n", Utf8(install).c_str());
+    return kExitBusy;
+  }
+  if (result == CycleResult::kNotADatabase) {
+    std::fprintf(stderr, "alertsummary: %s is not an alert database; no file was touched\n",
+                 Utf8(DatabasePathOf(install)).c_str());
+    return kExitFailure;
+  }
+  std::printf("stored %llu, marked %llu, left %llu\n", static_cast<unsigned long long>(tally.stored),
+              static_cast<unsigned long long>(tally.marked), static_cast<unsigned long long>(tally.left));
+  std::fflush(stdout);
+  return kExitOk;
+}
+
+}  // namespace
+
+Runner AddCollect(CLI::App& app) {
+  auto* sub = app.add_subcommand("collect", "Run collection cycles over an install folder, as the library's thread does");
+  auto options = std::make_shared<CollectOptions>();
+  AddCommonOptions(*sub, options->common);
+  auto* once = sub->add_flag("--once", options->once,
+                             "Run one cycle now (creating the database first when missing) and print the counts");
+  auto* interval = sub->add_option("--interval", options->interval, "Seconds between cycles (default 10)")
+                       ->check(CLI::PositiveNumber);
+  once->excludes(interval);
+  return [options]() {
+    const std::u16string install = ApplyCommonOptions(options->common);
+    if (!platform::Current().PathExists(install)) {
+      std::fprintf(stderr, "alertsummary: install folder %s does not exist\n", Utf8(install).c_str());
+      return kExitFailure;
+    }
+    if (options->once) return RunOnce(install, true);
+    const auto pause = std::chrono::milliseconds(static_cast<int64_t>(options->interval * 1000));
+    for (;;) {
+      std::this_thread::sleep_for(pause);
+      const int code = RunOnce(install, false);
+      if (code == kExitFailure) return code;
+    }
+  };
+}
+
+}  // namespace asum::tool
