@@ -39,7 +39,7 @@ int main(int argc, char** argv) {
     const int slot = static_cast<int>(i % (components + 1));
     const bool predefined = slot == components;
     const fs::path component = predefined ? fs::path("Predefine Alerts") : fs::path("Component" + std::to_string(slot + 1));
-    const fs::path report = dir / component / "AlertReports" / ((i + i / (components + 1)) % 3 == 2 ? "Outbox" : "Sent items");
+    const fs::path report = dir / component / "AlertReports" / ((i / 2 + i / 12) % 3 == 2 ? "Outbox" : "Sent items");
     fs::create_directories(report);
     const auto alert = asum::gen::GenerateAlert(seed, static_cast<uint32_t>(i), asum::gen::RowsForSize(size), predefined);
     std::ofstream out(report / alert.file_name, std::ios::binary);
