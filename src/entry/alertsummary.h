@@ -11,6 +11,8 @@
 #ifndef ALERTSUMMARY_H_
 #define ALERTSUMMARY_H_
 
+#include <stddef.h> /* wchar_t for C hosts */
+
 #ifdef _WIN32
 #define ALERTSUMMARY_EXPORT __declspec(dllexport)
 #define ALERTSUMMARY_CALL __cdecl
@@ -24,6 +26,9 @@ extern "C" {
 #endif
 
 ALERTSUMMARY_EXPORT void* ALERTSUMMARY_CALL _Run(void);
+/* filter and range are zero-terminated wide texts; null reads as empty. */
+ALERTSUMMARY_EXPORT int ALERTSUMMARY_CALL _GetAlertCount(const wchar_t* filter, const wchar_t* range);
+ALERTSUMMARY_EXPORT int ALERTSUMMARY_CALL _RunRetentionProc(void);
 
 #ifdef __cplusplus
 }

@@ -1,0 +1,85 @@
+#include "store/setting_db_management.h"
+
+#include "log/log.h"
+#include "platform/platform.h"
+#include "store/alert_table.h"
+
+namespace asum {
+namespace {
+
+constexpr int kExecuteAttempts = 7;
+
+std::unique_ptr<CSqlStatement> Prepare(CDbSQLite& db, const std::u16string& sql,
+                                       const std::vector<std::u16string>& params) {
+  std::unique_ptr<CSqlStatement> statement = db.Statement(sql);
+  for (size_t i = 0; i < params.size(); ++i) statement->BindText(static_cast<int>(i + 1), params[i]);
+  return statement;
+}
+
+}  // namespace
+
+std::u16string HostInstallFolder() {
+  const std::u16string exe = platform::Current().ExecutablePath();
+  const size_t last = exe.rfind(platform::kPathSeparator);
+  return last == std::u16string::npos ? std::u16string() : exe.substr(0, last);
+}
+
+std::u16string ExecuteQueryStatusLine(bool succeeded) {
+  return std::u16string(u"Inside ExecuteQuery function - Status: ") + (succeeded ? u"success" : u"failure");
+}
+
+CSettingDBManagement::CSettingDBManagement(BusyBudget* budget) { db_.SetBusyBudget(budget); }
+
+std::u16string CSettingDBManagement::GetAlertSummaryFolder(const std::u16string& install_folder) {
+  std::u16string folder = install_folder;
+  if (!folder.empty() && folder.back() != platform::kPathSeparator) folder += platform::kPathSeparator;
+  folder += u"Alert_Summary";
+  platform::Env& env = platform::Current();
+  if (!env.PathExists(folder)) env.CreateFolder(folder);
+  return folder;
+}
+
+std::u16string CSettingDBManagement::GetAlertSummaryFolder() { return GetAlertSummaryFolder(HostInstallFolder()); }
+
+std::u16string CSettingDBManagement::DatabasePath(const std::u16string& summary_folder) {
+  return summary_folder + platform::NativeSeparators(u"\\AlertSummaryDB.db");
+}
+
+bool CSettingDBManagement::OpenDB(const std::u16string& path) {
+  const bool existed = platform::Current().PathExists(path);
+  const bool opened = db_.Open(path);
+  WriteLog(u"Inside OpenDB function: " + path);
+  if (existed) return opened;
+  return db_.Statement(CreateAlertTableSql())->Execute();
+}
+
+bool CSettingDBManagement::CloseDB() { return db_.Close(); }
+
+bool CSettingDBManagement::ExecuteQuery(const std::u16string& sql, const std::vector<std::u16string>& params) {
+  bool ok = Prepare(db_, sql, params)->Execute();
+  WriteLog(ExecuteQueryStatusLine(ok));
+  for (int attempt = 1; !ok && attempt < kExecuteAttempts; ++attempt) ok = Prepare(db_, sql, params)->Execute();
+  return ok;
+}
+
+std::u16string CSettingDBManagement::ExecuteScalar(const std::u16string& sql,
+                                                   const std::vector<std::u16string>& params) {
+  std::unique_ptr<CSqlStatement> statement = Prepare(db_, sql, params);
+  return statement->NextRow() ? statement->ValueString(0) : std::u16string();
+}
+
+bool CSettingDBManagement::FillDatainDB(const std::u16string& alert_action, const std::u16string& alert_type,
+                                        const std::u16string& alert_name, const std::u16string& when,
+                                        const std::u16string& threshold, const std::u16string& who,
+                                        const std::u16string& operation, const std::u16string& component_name,
+                                        const std::u16string& email_status, const std::u16string& alert_path,
+                                        const std::u16string& server_name) {
+  WriteLog(u"Inside FillDatainDB function");
+  // Bound rather than spliced: a quote in a subject must not break the
+  // statement and keep the alert out of the table in every cycle.
+  return ExecuteQuery(u"INSERT into AlertDB VALUES(?,?,?,?,?,?,?,?,?, ?, ?)",
+                      {alert_action, alert_type, alert_name, when, threshold, who, operation, component_name,
+                       email_status, server_name, alert_path});
+}
+
+}  // namespace asum

@@ -1,0 +1,129 @@
+#include "store/setting_db_management.h"
+
+#include <gtest/gtest.h>
+
+#include "store/alert_table.h"
+#include "store_test_support.h"
+
+namespace asum {
+namespace {
+
+using test::StoreDir;
+
+TEST(AlertTable, CreateStatementIsExact) {
+  const std::u16string tabs(8, u'\t');
+  const std::u16string expected =
+      u"CREATE TABLE AlertDB (" + tabs + u" \"Alert Action\"\tTEXT NOT NULL," + tabs +
+      u" \"Alert Type\"\tTEXT NOT NULL," + tabs + u" \"Alert Name\"\tTEXT NOT NULL," + tabs +
+      u" \"When\"\tTEXT NOT NULL," + tabs + u" \"Threshold\"\tTEXT NOT NULL," + tabs + u" \"Who\"\tTEXT NOT NULL," +
+      tabs + u" \"Operation\"\tTEXT NOT NULL," + tabs + u" \"Component Name\"\tTEXT NOT NULL," + tabs +
+      u" \"EmailStatus\"\tTEXT NOT NULL," + tabs + u" \"Server Name\"\tTEXT NOT NULL," + tabs +
+      u" \"Alert Path\"\tTEXT NOT NULL)";
+  EXPECT_EQ(CreateAlertTableSql().size(), 411u);
+  EXPECT_EQ(CreateAlertTableSql(), expected);
+}
+
+TEST(AlertSummaryFolder, JoinsAndCreatesOneLevel) {
+  test::TempDir dir;
+  const std::u16string sep(1, platform::kPathSeparator);
+  EXPECT_EQ(CSettingDBManagement::GetAlertSummaryFolder(dir.path()), dir.path() + sep + u"Alert_Summary");
+  EXPECT_TRUE(platform::Current().PathExists(dir.path() + sep + u"Alert_Summary"));
+  EXPECT_EQ(CSettingDBManagement::GetAlertSummaryFolder(dir.path() + sep), dir.path() + sep + u"Alert_Summary");
+  // One level only: a missing parent is not created, and that is no error.
+  EXPECT_EQ(CSettingDBManagement::GetAlertSummaryFolder(dir.Join(u"a\\b")), dir.Join(u"a\\b\\Alert_Summary"));
+  EXPECT_FALSE(platform::Current().PathExists(dir.Join(u"a")));
+  EXPECT_EQ(CSettingDBManagement::DatabasePath(u"F"), u"F" + sep + u"AlertSummaryDB.db");
+}
+
+TEST(AlertSummaryFolder, ComesFromTheHostExecutable) {
+  struct Case {
+    std::u16string exe;
+    std::u16string install;
+  } cases[] = {
+      {platform::NativeSeparators(u"\\srv\\suite\\host.exe"), platform::NativeSeparators(u"\\srv\\suite")},
+      {u"host.exe", u""},  // no separator: the database folder is relative
+  };
+  test::FakeEnv env;
+  platform::ScopedEnv scoped(&env);
+  for (const Case& c : cases) {
+    env.executable = c.exe;
+    EXPECT_EQ(HostInstallFolder(), c.install) << test::Narrow(c.exe);
+  }
+}
+
+TEST(OpenDB, FirstOpenCreatesFileAndTableSecondOnlyOpens) {
+  test::CapturedLog log;
+  StoreDir dir;
+  const std::u16string path = CSettingDBManagement::DatabasePath(CSettingDBManagement::GetAlertSummaryFolder(dir.install()));
+  {
+    CSettingDBManagement store;
+    EXPECT_TRUE(store.OpenDB(path));
+  }
+  EXPECT_EQ(dir.RowCount(), 0);
+  {
+    CSettingDBManagement store;
+    EXPECT_TRUE(store.OpenDB(path)) << "the table exists: a second CREATE would fail";
+    EXPECT_TRUE(store.CloseDB());
+  }
+  const auto messages = log.Messages();
+  ASSERT_EQ(messages.size(), 2u);
+  EXPECT_EQ(messages[0], u"Inside OpenDB function: " + path);
+}
+
+// The table is left alone in a file that already exists, even when empty.
+TEST(OpenDB, ExistingEmptyFileGetsNoTable) {
+  StoreDir dir;
+  test::WriteText(dir.db_path(), "");
+  CSettingDBManagement store;
+  EXPECT_TRUE(store.OpenDB(dir.db_path()));
+  EXPECT_FALSE(store.FillDatainDB(u"", u"", u"", u"", u"", u"", u"", u"", u"", u"", u""));
+  EXPECT_EQ(store.ExecuteScalar(u"SELECT count(*) FROM AlertDB"), u"");
+}
+
+TEST(OpenDB, UnusableFilesFailWithoutCrashing) {
+  StoreDir dir;
+  test::WriteText(dir.db_path(), std::string(4096, 'j'));  // not a database
+  CSettingDBManagement store;
+  EXPECT_TRUE(store.OpenDB(dir.db_path())) << "opening reads nothing yet";
+  EXPECT_FALSE(store.ExecuteQuery(u"DELETE FROM AlertDB"));
+  EXPECT_EQ(store.ExecuteScalar(u"SELECT 1 FROM AlertDB"), u"");
+  EXPECT_FALSE(store.OpenDB(dir.folder() + platform::NativeSeparators(u"\\missing\\AlertSummaryDB.db")));
+}
+
+TEST(ExecuteQuery, LogsFirstOutcomeAndRetriesSevenTimesInAll) {
+  StoreDir dir;
+  dir.Create();
+  CSettingDBManagement store;
+  ASSERT_TRUE(store.OpenDB(dir.db_path()));
+  test::CapturedLog log;
+  EXPECT_TRUE(store.ExecuteQuery(u"DELETE FROM AlertDB"));
+  EXPECT_FALSE(store.ExecuteQuery(u"DELETE FROM nothing"));
+  EXPECT_EQ(log.Messages(), (std::vector<std::u16string>{ExecuteQueryStatusLine(true), ExecuteQueryStatusLine(false)}));
+  EXPECT_EQ(ExecuteQueryStatusLine(false), u"Inside ExecuteQuery function - Status: failure");
+}
+
+TEST(FillDatainDB, ValuesLandInTheirColumns) {
+  StoreDir dir;
+  dir.Create();
+  CSettingDBManagement store;
+  ASSERT_TRUE(store.OpenDB(dir.db_path()));
+  // Alert path is the tenth parameter, server name the eleventh.
+  ASSERT_TRUE(store.FillDatainDB(u"Email Alert", u"Type", u"Name", u"2024/03/05 14:07:09", u"N\\A", u"Who",
+                                 u"Op", u"Comp", u"Delivered", u"P", u"S"));
+  // Quotes, a NUL and text beyond the BMP: stored, cut at the NUL.
+  ASSERT_TRUE(store.FillDatainDB(u"Script Alert", u"O'Brien's \"type\"", u"'; DROP TABLE AlertDB; --",
+                                 std::u16string(u"2024\0junk", 9), u"", u"", u"", u"", u"", u"\U0001F600", u""));
+  ASSERT_TRUE(store.FillDatainDB(u"", u"", u"", u"", u"", u"", u"", u"", u"", u"", u""));
+  const auto rows = dir.Rows();
+  ASSERT_EQ(rows.size(), 3u);
+  EXPECT_EQ(rows[0], (std::vector<std::u16string>{u"Email Alert", u"Type", u"Name", u"2024/03/05 14:07:09", u"N\\A",
+                                                  u"Who", u"Op", u"Comp", u"Delivered", u"S", u"P"}));
+  EXPECT_EQ(rows[1][1], u"O'Brien's \"type\"");
+  EXPECT_EQ(rows[1][2], u"'; DROP TABLE AlertDB; --");
+  EXPECT_EQ(rows[1][3], u"2024");
+  EXPECT_EQ(rows[1][10], u"\U0001F600");
+  EXPECT_EQ(rows[2], std::vector<std::u16string>(11, u""));
+}
+
+}  // namespace
+}  // namespace asum
