@@ -39,15 +39,6 @@ TEST(SplitRange, CutsBoundsAroundTheMarker) {
   }
 }
 
-TEST(BuildCountStatement, KeepsTheStatementShapeAndBindsValues) {
-  const CountStatement s = BuildCountStatement(u"Threshold", kMarch);
-  EXPECT_EQ(s.sql,
-            u"SELECT Count(*) FROM AlertDB WHERE(\"When\" BETWEEN ?1 AND ?2)AND (\"Alert Type\" LIKE '%'||?3||'%')");
-  EXPECT_EQ(s.params, (std::vector<std::u16string>{u"2024/03/01 00:00:00", u"2024/03/31 23:59:59", u"Threshold"}));
-  const CountStatement all = BuildCountStatement(u"Email Alert", u"</FROM>");
-  EXPECT_EQ(all.sql, u"SELECT Count(*) FROM AlertDB WHERE (\"Alert Action\" LIKE '%'||?1||'%')");
-}
-
 class CountAlertsTest : public ::testing::Test {
  protected:
   void SetUp() override {

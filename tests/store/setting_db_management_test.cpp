@@ -35,22 +35,6 @@ TEST(AlertSummaryFolder, JoinsAndCreatesOneLevel) {
   EXPECT_EQ(CSettingDBManagement::DatabasePath(u"F"), u"F" + sep + u"AlertSummaryDB.db");
 }
 
-TEST(AlertSummaryFolder, ComesFromTheHostExecutable) {
-  struct Case {
-    std::u16string exe;
-    std::u16string install;
-  } cases[] = {
-      {platform::NativeSeparators(u"\\srv\\suite\\host.exe"), platform::NativeSeparators(u"\\srv\\suite")},
-      {u"host.exe", u""},  // no separator: the database folder is relative
-  };
-  test::FakeEnv env;
-  platform::ScopedEnv scoped(&env);
-  for (const Case& c : cases) {
-    env.executable = c.exe;
-    EXPECT_EQ(HostInstallFolder(), c.install) << test::Narrow(c.exe);
-  }
-}
-
 TEST(OpenDB, FirstOpenCreatesFileAndTableSecondOnlyOpens) {
   test::CapturedLog log;
   StoreDir dir;

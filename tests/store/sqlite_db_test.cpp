@@ -57,17 +57,6 @@ TEST_F(SqliteDbTest, NextRowWalksRowsThenResets) {
   EXPECT_TRUE(one->NextRow()) << "the reset statement starts over";
 }
 
-TEST_F(SqliteDbTest, BoundTextEndsAtItsFirstNul) {
-  auto insert = db_.Statement(u"INSERT INTO t VALUES(?)");
-  ASSERT_TRUE(insert->BindText(1, std::u16string(u"it's\0hidden", 11)));
-  EXPECT_FALSE(insert->BindText(2, u"no such parameter"));
-  ASSERT_TRUE(insert->Execute());
-  auto read = db_.Statement(u"SELECT v, length(v) FROM t");
-  ASSERT_TRUE(read->NextRow());
-  EXPECT_EQ(read->ValueString(0), u"it's");
-  EXPECT_EQ(read->ValueString(1), u"4");
-}
-
 TEST_F(SqliteDbTest, CloseFinalizesLiveStatementsWhichThenFailSafely) {
   EXPECT_TRUE(db_.Statement(u"INSERT INTO t VALUES('a')")->Execute());
   auto open_read = db_.Statement(u"SELECT v FROM t");
@@ -96,15 +85,6 @@ TEST(SqliteDbOpen, FailingOpenLeavesNothingOpen) {
   EXPECT_FALSE(db.IsOpen());
   EXPECT_FALSE(db.Open(dir.path())) << "a folder is not a database";
   EXPECT_FALSE(db.Statement(u"SELECT 1")->NextRow());
-}
-
-TEST(SqliteDbOpen, NewFileStoresUtf16Text) {
-  test::TempDir dir;
-  CDbSQLite db;
-  ASSERT_TRUE(db.Open(dir.Join(u"t.db")));
-  auto s = db.Statement(u"PRAGMA encoding");
-  ASSERT_TRUE(s->NextRow());
-  EXPECT_EQ(s->ValueString(0), u"UTF-16le");
 }
 
 }  // namespace

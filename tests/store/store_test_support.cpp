@@ -59,17 +59,7 @@ std::vector<std::vector<std::u16string>> StoreDir::Rows() const {
   return rows;
 }
 
-int64_t StoreDir::RowCount() const {
-  RawConnection raw(db_path());
-  sqlite3_stmt* stmt = nullptr;
-  int64_t count = -1;
-  if (sqlite3_prepare_v2(raw.get(), "SELECT count(*) FROM AlertDB", -1, &stmt, nullptr) == SQLITE_OK &&
-      sqlite3_step(stmt) == SQLITE_ROW) {
-    count = sqlite3_column_int64(stmt, 0);
-  }
-  sqlite3_finalize(stmt);
-  return count;
-}
+int64_t StoreDir::RowCount() const { return static_cast<int64_t>(Rows().size()); }
 
 RawConnection::RawConnection(const std::u16string& path) {
   EXPECT_EQ(sqlite3_open16(path.c_str(), &db_), SQLITE_OK);
