@@ -9,6 +9,8 @@ root=$(pwd)
 [[ "${SKIP_SETUP:-0}" == 1 ]] || scripts/setup.sh
 
 jobs=$(nproc)
+# Alert dates are written in local time; the expected rows are in UTC.
+export TZ=UTC
 export CTEST_OUTPUT_ON_FAILURE=1
 
 step() { printf '\n=== %s\n' "$*"; }

@@ -4,9 +4,17 @@
 //
 //   testhost [--library PATH] STEP...
 //   run             calls _Run and prints "run <nonzero|null>"
+//   count F R       calls _GetAlertCount with filter F and range R (UTF-8
+//                   arguments) and prints "count <n>"
+//   retention       calls _RunRetentionProc and prints "retention <n>"
+//   await F R N MS  calls _GetAlertCount every 100 ms until it gives N or MS
+//                   milliseconds passed; prints "await <last count>"
 //   sleep MS        waits
 //   unload          unloads the library
 //   exit            ends the process with exit(0) at once (static teardown runs)
+//
+// An argument "@empty" stands for the empty text (some launchers drop empty
+// arguments).
 //
 // Exit code 0 when every step ran, 2 on bad arguments or a library that does
 // not load, 3 when an export is missing.
@@ -60,6 +68,36 @@ std::string Widen(const char* s) { return s; }
 #endif
 
 using RunFn = void* (*)();
+using CountFn = int (*)(const wchar_t*, const wchar_t*);
+using RetentionFn = int (*)();
+
+#ifdef _WIN32
+std::wstring HostText(const char* utf8) { return std::strcmp(utf8, "@empty") == 0 ? L"" : Widen(utf8); }
+#else
+// wchar_t is 32-bit here: decode UTF-8 into code points.
+std::wstring HostText(const char* utf8) {
+  std::wstring out;
+  if (std::strcmp(utf8, "@empty") == 0) return out;
+  const auto* p = reinterpret_cast<const unsigned char*>(utf8);
+  while (*p) {
+    unsigned c = *p++;
+    int extra = c >= 0xF0 ? 3 : c >= 0xE0 ? 2 : c >= 0xC0 ? 1 : 0;
+    c &= extra == 3 ? 0x07 : extra == 2 ? 0x0F : extra == 1 ? 0x1F : 0x7F;
+    while (extra-- > 0 && (*p & 0xC0) == 0x80) c = (c << 6) | (*p++ & 0x3F);
+    out.push_back(static_cast<wchar_t>(c));
+  }
+  return out;
+}
+#endif
+
+void* Require(Module module, const char* name) {
+  void* symbol = Symbol(module, name);
+  if (symbol == nullptr) {
+    std::fprintf(stderr, "testhost: %s is not exported\n", name);
+    std::exit(3);
+  }
+  return symbol;
+}
 
 }  // namespace
 
@@ -78,12 +116,28 @@ int main(int argc, char** argv) {
   for (; i < argc; ++i) {
     const std::string step = argv[i];
     if (step == "run") {
-      auto run = reinterpret_cast<RunFn>(Symbol(module, "_Run"));
-      if (run == nullptr) {
-        std::fprintf(stderr, "testhost: _Run is not exported\n");
-        return 3;
-      }
+      auto run = reinterpret_cast<RunFn>(Require(module, "_Run"));
       std::printf("run %s\n", run() != nullptr ? "nonzero" : "null");
+    } else if (step == "count" && i + 2 < argc) {
+      auto count = reinterpret_cast<CountFn>(Require(module, "_GetAlertCount"));
+      const std::wstring filter = HostText(argv[i + 1]), range = HostText(argv[i + 2]);
+      i += 2;
+      std::printf("count %d\n", count(filter.c_str(), range.c_str()));
+    } else if (step == "await" && i + 4 < argc) {
+      auto count = reinterpret_cast<CountFn>(Require(module, "_GetAlertCount"));
+      const std::wstring filter = HostText(argv[i + 1]), range = HostText(argv[i + 2]);
+      const int want = std::atoi(argv[i + 3]);
+      const auto deadline = std::chrono::steady_clock::now() + std::chrono::milliseconds(std::atoi(argv[i + 4]));
+      i += 4;
+      int got = count(filter.c_str(), range.c_str());
+      while (got != want && std::chrono::steady_clock::now() < deadline) {
+        std::this_thread::sleep_for(std::chrono::milliseconds(100));
+        got = count(filter.c_str(), range.c_str());
+      }
+      std::printf("await %d\n", got);
+    } else if (step == "retention") {
+      auto retention = reinterpret_cast<RetentionFn>(Require(module, "_RunRetentionProc"));
+      std::printf("retention %d\n", retention());
     } else if (step == "sleep" && i + 1 < argc) {
       std::this_thread::sleep_for(std::chrono::milliseconds(std::atoi(argv[++i])));
     } else if (step == "unload") {

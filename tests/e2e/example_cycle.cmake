@@ -1,0 +1,47 @@
+# The host in a copy of the example install folder: a count first (which
+# creates the database), then _Run; after the first cycle every example alert
+# is stored with the expected row or marked, every file has its PROC_ name,
+# and the host's counts agree.
+include(${CMAKE_CURRENT_LIST_DIR}/e2e_common.cmake)
+set(install "${WORK}/example_cycle/install")
+e2e_prepare_install("${install}")
+file(COPY "${SOURCE_DIR}/examples/install/" DESTINATION "${install}")
+
+set(all "<FROM></FROM><TO>9999/99/99 99:99:99</TO>")
+set(june "<FROM>2026/06/01 00:00:00</FROM><TO>2026/06/30 23:59:59</TO>")
+e2e_host(output rc "${install}"
+  count @empty "${all}"
+  run
+  await @empty "${all}" 36 60000
+  count "Script Alert" "${all}"
+  count "Email Alert" "${all}"
+  count "Change" "${all}"
+  count "Data Leakage" "${all}"
+  count @empty "${june}"
+  count "Change" "${june}")
+if(NOT rc EQUAL 0)
+  e2e_fail("host ended with ${rc}: ${output}")
+endif()
+set(expected "count 0\nrun nonzero\nawait 36\ncount 10\ncount 26\ncount 20\ncount 2\ncount 2\ncount 2\n")
+if(NOT output STREQUAL expected)
+  e2e_fail("host printed:\n${output}\nexpected:\n${expected}")
+endif()
+
+file(GLOB_RECURSE left "${install}/*.eml*")
+list(FILTER left EXCLUDE REGEX "/PROC_[^/]*$")
+if(left)
+  e2e_fail("files left unprocessed: ${left}")
+endif()
+
+find_program(SQLITE3 sqlite3)
+if(NOT SQLITE3)
+  message(STATUS "SKIPPED: the sqlite3 shell is not installed; rows not compared")
+  return()
+endif()
+execute_process(COMMAND ${SQLITE3} -separator " | " "${install}/Alert_Summary/AlertSummaryDB.db"
+  INPUT_FILE "${CMAKE_CURRENT_LIST_DIR}/rows.sql" OUTPUT_VARIABLE rows RESULT_VARIABLE rc)
+file(READ "${CMAKE_CURRENT_LIST_DIR}/example_rows.txt" expected_rows)
+if(NOT rc EQUAL 0 OR NOT rows STREQUAL expected_rows)
+  file(WRITE "${WORK}/example_cycle/rows.txt" "${rows}")
+  e2e_fail("stored rows differ from example_rows.txt; see ${WORK}/example_cycle/rows.txt")
+endif()
