@@ -22,7 +22,15 @@ std::u16string HostText(const wchar_t* text) {
 
 int GetAlertCountForHost(const wchar_t* filter, const wchar_t* range) {
   try {
-    return CountAlerts(HostInstallFolder(), HostText(filter), HostText(range));
+    return CountForHost(HostText(filter), HostText(range));
+  } catch (...) {
+    return 0;
+  }
+}
+
+int CountForHost(const std::u16string& filter, const std::u16string& range) {
+  try {
+    return CountAlerts(HostInstallFolder(), filter, range);
   } catch (...) {
     return 0;
   }

@@ -14,6 +14,8 @@ namespace asum {
 std::u16string HostText(const wchar_t* text);
 
 int GetAlertCountForHost(const wchar_t* filter, const wchar_t* range);
+// The same for texts already read from the host's string objects.
+int CountForHost(const std::u16string& filter, const std::u16string& range);
 int RunRetentionForHost();
 
 }  // namespace asum
