@@ -1,7 +1,7 @@
 #include "store/alert_count.h"
 
 #include "store/setting_db_management.h"
-#include "store/wide_number.h"
+#include "common/wide_number.h"
 
 namespace asum {
 namespace {
@@ -73,7 +73,7 @@ int CountAlerts(const std::u16string& install_folder, const std::u16string& filt
       CSettingDBManagement::DatabasePath(CSettingDBManagement::GetAlertSummaryFolder(install_folder));
   if (!store.OpenDB(path)) return 0;  // the connection object releases what the open left
   const CountStatement statement = BuildCountStatement(filter, range);
-  const int32_t count = WcstolDecimal(store.ExecuteScalar(statement.sql, statement.params));
+  const int32_t count = WcstolBase10(store.ExecuteScalar(statement.sql, statement.params));
   store.Connection().Close();
   return count;
 }

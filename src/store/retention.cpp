@@ -5,7 +5,7 @@
 #include "common/utf.h"
 #include "store/retention_settings.h"
 #include "store/setting_db_management.h"
-#include "store/wide_number.h"
+#include "common/wide_number.h"
 
 namespace asum {
 namespace {
@@ -40,7 +40,7 @@ int32_t RetentionDays(const std::u16string& setting) {
   for (size_t at = text.find(kUnit); at != std::u16string::npos; at = text.find(kUnit, at)) {
     text.erase(at, kUnit.size());
   }
-  return WcstolDecimal(text);
+  return WcstolBase10(text);
 }
 
 std::u16string CutoffText(const platform::SystemTime& now, int32_t days) {
