@@ -9,7 +9,16 @@ export WINEDLLOVERRIDES="mscoree,mshtml="
 export WINEARCH="${WINEARCH:-win64}"
 unset DISPLAY
 
+# A prefix made before the 32-bit Wine was installed cannot start 32-bit
+# programs ("could not load kernel32.dll"), and updating it in place fails the
+# same way here: the project's prefix is then made anew.
+wow64_ready() { [ -f "${WINEPREFIX}/drive_c/windows/syswow64/kernel32.dll" ]; }
+if [ -f "${WINEPREFIX}/system.reg" ] && [ -x /usr/lib/wine/wine ] && ! wow64_ready; then
+  wineserver -k >/dev/null 2>&1 || true
+  rm -rf "${WINEPREFIX}"
+fi
 if [ ! -f "${WINEPREFIX}/system.reg" ]; then
+  wineserver -k >/dev/null 2>&1 || true  # a persistent server would never let -w return
   wineboot -u </dev/null >/dev/null 2>&1
   wineserver -w
 fi

@@ -8,7 +8,8 @@ packages=(
   libsqlite3-dev sqlite3 libgtest-dev googletest
   libcli11-dev nlohmann-json3-dev
   g++-mingw-w64-x86-64-posix binutils-mingw-w64-x86-64
-  wine wine64
+  g++-mingw-w64-i686-posix binutils-mingw-w64-i686
+  wine wine64 wine32:i386
   clang libclang-rt-14-dev
 )
 
@@ -21,6 +22,8 @@ if ! command -v npm >/dev/null 2>&1; then missing+=(npm); fi
 if ((${#missing[@]})); then
   echo "setup: installing ${missing[*]}"
   export DEBIAN_FRONTEND=noninteractive
+  # The x86 DLL's tests need the 32-bit Wine.
+  dpkg --print-foreign-architectures | grep -qx i386 || dpkg --add-architecture i386
   apt-get update -q
   apt-get install -y -q --no-install-recommends "${missing[@]}"
 fi

@@ -24,10 +24,16 @@ step "Linux tests"
 step "Windows x64 build"
 cmake -S . -B build/win64 -G Ninja -DCMAKE_TOOLCHAIN_FILE=cmake/mingw-w64-x86_64.cmake >/dev/null
 cmake --build build/win64 -j"$jobs"
-step "Windows x64 tests (Wine)"
+step "Windows x86 build"
+cmake -S . -B build/win32 -G Ninja -DCMAKE_TOOLCHAIN_FILE=cmake/mingw-w64-i686.cmake >/dev/null
+cmake --build build/win32 -j"$jobs"
+
 # shellcheck source=../.ci/wine-env.sh
 source .ci/wine-env.sh
 trap wine_stop EXIT
+step "Windows x64 tests (Wine)"
 (cd build/win64 && ctest -j"$jobs" --timeout 300)
+step "Windows x86 tests (Wine)"
+(cd build/win32 && ctest -j"$jobs" --timeout 300)
 
 step "All builds green"

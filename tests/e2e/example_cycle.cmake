@@ -27,6 +27,14 @@ if(NOT output STREQUAL expected)
   e2e_fail("host printed:\n${output}\nexpected:\n${expected}")
 endif()
 
+if(WINDOWS)
+  # Every way the service hands over its string objects, on the stored rows.
+  e2e_host(output rc "${install}" abicheck Change "${all}" 20 36 abicheck @empty "${june}" 2 2)
+  if(NOT rc EQUAL 0 OR NOT output STREQUAL "abicheck ok\nabicheck ok\n")
+    e2e_fail("string passing: ${rc} ${output}")
+  endif()
+endif()
+
 file(GLOB_RECURSE left "${install}/*.eml*")
 list(FILTER left EXCLUDE REGEX "/PROC_[^/]*$")
 if(left)
