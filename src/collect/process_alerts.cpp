@@ -12,11 +12,11 @@
 namespace asum {
 namespace {
 
-const std::u16string kEmailAlert = u"Email Alert";
-const std::u16string kScriptAlert = u"Script Alert";
-const std::u16string kDataLeakage = u"Potential Data Leakage";
-const std::u16string kOutsideHours = u"Activity Outside of Business Hours";
-const std::u16string kEnvironmentChanges = u"All Environment Changes";
+constexpr std::u16string_view kEmailAlert = u"Email Alert";
+constexpr std::u16string_view kScriptAlert = u"Script Alert";
+constexpr std::u16string_view kDataLeakage = u"Potential Data Leakage";
+constexpr std::u16string_view kOutsideHours = u"Activity Outside of Business Hours";
+constexpr std::u16string_view kEnvironmentChanges = u"All Environment Changes";
 
 bool IsActivityCategory(const std::u16string& category) {
   return category == kOutsideHours || category == kEnvironmentChanges;

@@ -11,12 +11,12 @@ constexpr std::u16string_view kScriptWords = u"Script Execution";
 constexpr std::u16string_view kThresholdWord = u"Threshold";
 constexpr std::u16string_view kLeakageWords = u"Potential Data Leakage";
 
-const std::u16string kEmailAlert = u"Email Alert";
-const std::u16string kScriptAlert = u"Script Alert";
-const std::u16string kThresholdYes = u"Yes";
-const std::u16string kThresholdNo = u"No";
-const std::u16string kThresholdNone = u"N\\A";
-const std::u16string kThreatModels = u"Threat Models";
+constexpr std::u16string_view kEmailAlert = u"Email Alert";
+constexpr std::u16string_view kScriptAlert = u"Script Alert";
+constexpr std::u16string_view kThresholdYes = u"Yes";
+constexpr std::u16string_view kThresholdNo = u"No";
+constexpr std::u16string_view kThresholdNone = u"N\\A";
+constexpr std::u16string_view kThreatModels = u"Threat Models";
 
 bool Contains(std::u16string_view text, std::u16string_view marker) {
   return Find(text, marker) >= 0;
