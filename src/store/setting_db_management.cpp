@@ -49,8 +49,21 @@ bool CSettingDBManagement::OpenDB(const std::u16string& path) {
   const bool existed = platform::Current().PathExists(path);
   const bool opened = db_.Open(path);
   WriteLog(u"Inside OpenDB function: " + path);
-  if (existed) return opened;
-  return db_.Statement(CreateAlertTableSql())->Execute();
+  if (!existed) return db_.Statement(CreateAlertTableSql())->Execute();
+  if (opened) CreateMissingTable(path);
+  return opened;
+}
+
+void CSettingDBManagement::CreateMissingTable(const std::u16string& path) {
+  // A process that died while first creating the file leaves a database
+  // without its table; every insert would then fail forever. A file that is
+  // not a database fails the probe and is left untouched.
+  std::unique_ptr<CSqlStatement> probe =
+      db_.Statement(u"SELECT count(*) FROM sqlite_master WHERE type = 'table' AND name = 'AlertDB'");
+  if (!probe->NextRow() || probe->ValueString(0) != u"0") return;
+  probe.reset();
+  const bool created = db_.Statement(CreateAlertTableSql())->Execute();
+  WriteLog(u"AlertDB table missing in " + path + (created ? u"; created it" : u"; could not create it"));
 }
 
 bool CSettingDBManagement::CloseDB() { return db_.Close(); }

@@ -43,7 +43,9 @@ class CSettingDBManagement {
 
   // Opens the file, logging "Inside OpenDB function: " + path. A file that did
   // not exist before gets the AlertDB table (the result is then that of the
-  // CREATE TABLE); an existing file is opened without looking for the table.
+  // CREATE TABLE). An existing database without the table (left empty by a
+  // crash during its creation) gets it too, with a log line; a file that is
+  // not a database is opened and left untouched.
   bool OpenDB(const std::u16string& path);
   bool CloseDB();
 
@@ -68,6 +70,8 @@ class CSettingDBManagement {
   CDbSQLite& Connection() { return db_; }
 
  private:
+  void CreateMissingTable(const std::u16string& path);
+
   CDbSQLite db_;
 };
 

@@ -2,6 +2,8 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
+
 #include "store/alert_table.h"
 #include "store_test_support.h"
 
@@ -55,13 +57,18 @@ TEST(OpenDB, FirstOpenCreatesFileAndTableSecondOnlyOpens) {
 }
 
 // The table is left alone in a file that already exists, even when empty.
-TEST(OpenDB, ExistingEmptyFileGetsNoTable) {
+TEST(OpenDB, ExistingDatabaseWithoutTheTableGetsIt) {
   StoreDir dir;
-  test::WriteText(dir.db_path(), "");
+  test::WriteText(dir.db_path(), "");  // what a crash during the first creation leaves
+  test::CapturedLog log;
   CSettingDBManagement store;
   EXPECT_TRUE(store.OpenDB(dir.db_path()));
-  EXPECT_FALSE(store.FillDatainDB(u"", u"", u"", u"", u"", u"", u"", u"", u"", u"", u""));
-  EXPECT_EQ(store.ExecuteScalar(u"SELECT count(*) FROM AlertDB"), u"");
+  EXPECT_TRUE(store.FillDatainDB(u"", u"", u"", u"", u"", u"", u"", u"", u"", u"", u""));
+  EXPECT_EQ(store.ExecuteScalar(u"SELECT count(*) FROM AlertDB"), u"1");
+  EXPECT_EQ(store.ExecuteScalar(u"SELECT sql FROM sqlite_master WHERE name = 'AlertDB'"), CreateAlertTableSql());
+  const auto messages = log.Messages();
+  EXPECT_EQ(std::count(messages.begin(), messages.end(), u"AlertDB table missing in " + dir.db_path() + u"; created it"),
+            1);
 }
 
 TEST(OpenDB, UnusableFilesFailWithoutCrashing) {

@@ -1,8 +1,11 @@
 #include <cstdio>
 #include <memory>
 
+#include "collect/cycle.h"
 #include "commands.h"
+#include "platform/platform.h"
 #include "store/alert_count.h"
+#include "store/database_probe.h"
 
 namespace asum::tool {
 namespace {
@@ -29,6 +32,11 @@ Runner AddCount(CLI::App& app) {
   range->excludes(from)->excludes(to);
   return [options, range]() {
     const std::u16string install = ApplyCommonOptions(options->common);
+    const std::u16string db_path = DatabasePathOf(install);
+    if (platform::Current().PathExists(db_path) && !IsDatabaseFile(db_path)) {
+      std::fprintf(stderr, "alertsummary: %s is not an alert database\n", Utf8(db_path).c_str());
+      return kExitFailure;
+    }
     const std::u16string range_text = range->count() > 0 ? Utf16(options->range) : RangeText(options->from, options->to);
     std::printf("%d\n", CountAlerts(install, Utf16(options->filter), range_text));
     return kExitOk;
