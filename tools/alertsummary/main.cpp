@@ -44,6 +44,8 @@ int main(int argc, char** argv) {
   CLI::App app{"Summarises the alert e-mails an alerting service saved: collects them into the alert database, "
                "inspects single files, counts, reports and purges stored alerts."};
   app.require_subcommand(1);
+  // Paths such as /srv/x must never read as Windows-style options.
+  app.allow_windows_style_options(false);
   app.set_help_all_flag("--help-all", "Help for every subcommand");
   Runner runners[] = {AddCollect(app), AddInspect(app), AddCount(app), AddReport(app), AddPurge(app)};
   try {
