@@ -7,6 +7,9 @@
 
 #ifdef _WIN32
 #include <windows.h>
+// Keep the A/W macros from renaming Env's methods.
+#undef MoveFile
+#undef DeleteFile
 #endif
 
 #include "platform/platform.h"
@@ -36,7 +39,7 @@ std::u16string Install::DropAtomically(const std::u16string& name, const std::st
   const std::u16string target = SentFolder() + platform::kPathSeparator + name;
   platform::Env& env = platform::Env::Default();
   if (!env.WriteFile(temp, bytes).ok()) ADD_FAILURE() << "cannot write " << Narrow(temp);
-  if (!env.MoveFile(temp, target).ok()) ADD_FAILURE() << "cannot rename into " << Narrow(target);
+  if (!env.RenameNoReplace(temp, target).ok()) ADD_FAILURE() << "cannot rename into " << Narrow(target);
   return target;
 }
 

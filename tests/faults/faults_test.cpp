@@ -6,6 +6,7 @@
 
 #include <atomic>
 #include <chrono>
+#include <functional>
 #include <string>
 
 #ifndef _WIN32
@@ -105,8 +106,8 @@ TEST(StoreFaults, DatabaseReplacedByAnotherFileIsNeverTouchedAndDeletedIsRebuilt
 // change refuses them (a read-only folder does not stop root).
 class RefusingEnv : public platform::Env {
  public:
-  platform::FileResult MoveFile(const std::u16string&, const std::u16string&) override { return Denied(); }
-  platform::FileResult DeleteFile(const std::u16string&) override { return Denied(); }
+  platform::FileResult RenameNoReplace(const std::u16string&, const std::u16string&) override { return Denied(); }
+  platform::FileResult RemoveFile(const std::u16string&) override { return Denied(); }
 
  private:
   static platform::FileResult Denied() { return {platform::FileStatus::kAccessDenied, 5}; }
