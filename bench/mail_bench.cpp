@@ -187,6 +187,7 @@ int main() {
   std::printf("messages: %zu, %.1f KB average\n", messages.size(), total / 1024.0 / messages.size());
   std::printf("load + 4 getters: %.1f MB/s, %.0f messages/s\n", mb / (load_s + get_s), n / (load_s + get_s));
   std::printf("  load %.0f%%, getters %.0f%%\n", 100 * load_s / (load_s + get_s), 100 * get_s / (load_s + get_s));
+  std::printf("SUMMARY mail | reader + 4 getters, MB/s | %.1f\n", mb / (load_s + get_s));
 
   // The pieces side by side on the same bytes, as a share of one pass.
   std::string encoded;
@@ -233,6 +234,8 @@ int main() {
     std::filesystem::remove(path);
     std::printf("one %.1f MB message: peak heap %.2fx its size, %.2f s, body %.1f M characters\n", size / 1e6,
                 static_cast<double>(g_peak.load() - base) / size, secs, got / 1e6);
+    std::printf("SUMMARY mail | peak heap / size, one %.0f MB message | %.2f\n", size / 1e6,
+                static_cast<double>(g_peak.load() - base) / size);
   }
   return sink == 42 ? 1 : 0;
 }

@@ -137,6 +137,8 @@ int main(int argc, char** argv) {
     const double count_ms = Median(ours), count_bare = Median(bare);
     std::printf("%10d  %12.2f %12.2f %7.2f  %12.2f %12.2f %7.2f   (count %d)\n", rows, count_ms, count_bare,
                 count_ms / count_bare, purge_ms, bare_purge_ms, purge_ms / bare_purge_ms, ours_result);
+    std::printf("SUMMARY store | count / bare at %d rows | %.2f\n", rows, count_ms / count_bare);
+    std::printf("SUMMARY store | purge / bare at %d rows | %.2f\n", rows, purge_ms / bare_purge_ms);
     fs::remove_all(fs::path(install));
   }
   fs::remove_all(root);
