@@ -1,12 +1,21 @@
 #include "collect/alert_message.h"
 
+#include "log/log.h"
 #include "mail/ck_email.h"
 
 namespace asum {
 
 bool LoadAlertMessage(const std::u16string& path, AlertMessage* message) {
   mail::CkEmail email;
-  if (!email.LoadEml(path)) return false;
+  if (!email.LoadEml(path)) {
+    // A file its writer still holds is the one failure worth a line: it is
+    // normal, passing, and explains why a fresh alert waits a cycle.
+    const platform::FileResult& read = email.impl()->last_read();
+    if (read.status == platform::FileStatus::kSharingViolation) {
+      WriteLog(path + u" is still being written (" + read.Describe() + u"); it is offered again next cycle");
+    }
+    return false;
+  }
   // Read back as zero-terminated texts, as the reader's callers always have.
   mail::CkString text;
   email.get_FromAddress(text);

@@ -39,11 +39,11 @@ MarkResult MarkProcessed(const std::u16string& path, platform::FileResult* failu
   platform::Env& env = platform::Current();
   const std::u16string target = ProcName(path);
   if (!env.PathExists(target)) {
-    *failure = env.MoveFile(path, target);
+    *failure = env.RenameNoReplace(path, target);
     if (failure->ok()) return MarkResult::kRenamed;
     if (failure->status != platform::FileStatus::kAlreadyExists) return MarkResult::kFailed;
   }
-  *failure = env.DeleteFile(path);
+  *failure = env.RemoveFile(path);
   return failure->ok() ? MarkResult::kDeleted : MarkResult::kFailed;
 }
 

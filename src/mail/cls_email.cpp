@@ -39,7 +39,8 @@ ClsEmail::~ClsEmail() = default;
 bool ClsEmail::LoadEml(const std::u16string& path) {
   try {
     std::string bytes;
-    if (!platform::Current().ReadFile(path, &bytes, kMaxMessageFileBytes).ok()) return false;
+    last_read_ = platform::Current().ReadFile(path, &bytes, kMaxMessageFileBytes);
+    if (!last_read_.ok()) return false;
     return LoadEmlFromMemory(std::move(bytes), CurrentDateContext());
   } catch (...) {
     return false;

@@ -31,6 +31,9 @@ class ClsEmail {
   // Reads the file through platform::Current().ReadFile and loads it with the
   // machine's date facts (CurrentDateContext).
   bool LoadEml(const std::u16string& path);
+  // How the last LoadEml's read of its file went (ok when the file was read,
+  // whatever the parse gave).
+  const platform::FileResult& last_read() const { return last_read_; }
   // Loads a message held in memory; the bytes are consumed, so their memory
   // is given back as soon as the parsed parts hold what they need.
   bool LoadEmlFromMemory(std::string bytes, const DateContext& context);
@@ -46,6 +49,7 @@ class ClsEmail {
 
  private:
   std::unique_ptr<Email2> message_;
+  platform::FileResult last_read_;
 };
 
 // Parses `bytes` into a new message; throws only std::bad_alloc.

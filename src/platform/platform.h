@@ -111,9 +111,11 @@ class Env {
                           std::vector<DirEntry>* out);
   // One level; fails when the folder exists.
   virtual FileResult CreateFolder(const std::u16string& path);
-  // Renames without replacing: an existing target gives kAlreadyExists.
-  virtual FileResult MoveFile(const std::u16string& from, const std::u16string& to);
-  virtual FileResult DeleteFile(const std::u16string& path);
+  // Renames without replacing (MoveFileW): an existing target gives
+  // kAlreadyExists. (No method here bears a name that <windows.h> turns into
+  // a macro, so files that include it see the same class.)
+  virtual FileResult RenameNoReplace(const std::u16string& from, const std::u16string& to);
+  virtual FileResult RemoveFile(const std::u16string& path);  // DeleteFileW
   // Reads a whole file. On Windows the file is opened with FILE_SHARE_READ only,
   // so a file that a writer still holds open fails with kSharingViolation and is
   // read in a later cycle. POSIX has no share modes: a file being written is

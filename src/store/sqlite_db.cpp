@@ -8,9 +8,11 @@
 namespace asum {
 namespace {
 
-// Short first waits so that a brief insert of the processing thread costs a
-// query little; longer ones later so that a long lock costs little CPU.
-constexpr int kBusyStepsMs[] = {1, 2, 5, 10, 15, 20, 25, 25, 25, 50, 50, 100};
+// Waits stay short: the processing thread commits each alert on its own and
+// locks again right after, so a waiting reader only gets in through the short
+// gaps between commits; a reader that slept 100 ms at a time could miss every
+// gap for seconds. A probe every few milliseconds costs next to nothing.
+constexpr int kBusyStepsMs[] = {1, 1, 2, 2, 3, 5};
 
 }  // namespace
 

@@ -233,7 +233,7 @@ TEST_F(ProcessAlertFilesTest, AFailedInsertLeavesTheFileForTheNextCycle) {
 
 class RefusingRename : public platform::Env {
  public:
-  platform::FileResult MoveFile(const std::u16string&, const std::u16string&) override {
+  platform::FileResult RenameNoReplace(const std::u16string&, const std::u16string&) override {
     return {platform::FileStatus::kAccessDenied, 5};
   }
 };
@@ -264,6 +264,34 @@ TEST(ProcName, PrefixesTheFileName) {
   const std::u16string sep(1, platform::kPathSeparator);
   EXPECT_EQ(ProcName(sep + u"r" + sep + u"a.eml"), sep + u"r" + sep + u"PROC_a.eml");
   EXPECT_EQ(ProcName(u"a.eml"), sep + u"PROC_a.eml");
+}
+
+}  // namespace
+}  // namespace asum
+
+namespace asum {
+namespace {
+
+class HeldByWriter : public platform::Env {
+ public:
+  platform::FileResult ReadFile(const std::u16string&, std::string*, uint64_t) override {
+    return {platform::FileStatus::kSharingViolation, 32};
+  }
+};
+
+TEST_F(ProcessAlertFilesTest, AFileStillBeingWrittenWaitsForTheNextCycle) {
+  const auto path = Place(u"Comp", u"a.eml", Message("Email Alert: T \"N\" (S(C)\\R\\X)", kActivityTable));
+  {
+    HeldByWriter held;
+    platform::ScopedEnv scope(&held);
+    EXPECT_EQ(Process(u"Comp", {path}).left, 1u);
+  }
+  EXPECT_EQ(Names(u"Comp"), std::vector<std::u16string>{u"a.eml"});
+  const auto messages = log_.Messages();
+  EXPECT_NE(std::find(messages.begin(), messages.end(),
+                      path + u" is still being written (in use by another process (32)); it is offered again next cycle"),
+            messages.end());
+  EXPECT_EQ(Process(u"Comp", {path}).stored, 1u);
 }
 
 }  // namespace

@@ -7,9 +7,6 @@
 
 #ifdef _WIN32
 #include <windows.h>
-// Keep the A/W macros from renaming Env's methods.
-#undef MoveFile
-#undef DeleteFile
 #endif
 
 #include "platform/platform.h"

@@ -88,7 +88,7 @@ FileResult Env::CreateFolder(const std::u16string& path) {
   return FromErrno(errno);
 }
 
-FileResult Env::MoveFile(const std::u16string& from, const std::u16string& to) {
+FileResult Env::RenameNoReplace(const std::u16string& from, const std::u16string& to) {
   // link + unlink refuses an existing target atomically, as MoveFileW does;
   // renameat2(RENAME_NOREPLACE) is not available on every file system.
   const std::string src = ToNative(from), dst = ToNative(to);
@@ -110,7 +110,7 @@ FileResult Env::MoveFile(const std::u16string& from, const std::u16string& to) {
   return FromErrno(err);
 }
 
-FileResult Env::DeleteFile(const std::u16string& path) {
+FileResult Env::RemoveFile(const std::u16string& path) {
   if (::unlink(ToNative(path).c_str()) == 0) return {};
   return FromErrno(errno);
 }

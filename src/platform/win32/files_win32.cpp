@@ -36,12 +36,12 @@ FileResult Env::CreateFolder(const std::u16string& path) {
   return FromLastError(::GetLastError());
 }
 
-FileResult Env::MoveFile(const std::u16string& from, const std::u16string& to) {
+FileResult Env::RenameNoReplace(const std::u16string& from, const std::u16string& to) {
   if (::MoveFileW(W(from), W(to))) return {};
   return FromLastError(::GetLastError());
 }
 
-FileResult Env::DeleteFile(const std::u16string& path) {
+FileResult Env::RemoveFile(const std::u16string& path) {
   if (::DeleteFileW(W(path))) return {};
   return FromLastError(::GetLastError());
 }

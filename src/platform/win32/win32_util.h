@@ -9,12 +9,6 @@
 #endif
 #include <windows.h>
 
-// Env has methods of these names; the A/W macros would rename them in this
-// backend only, and every other file would see another class.
-#undef MoveFile
-#undef DeleteFile
-#undef CreateFile
-
 #include <string>
 
 #include "platform/platform.h"
