@@ -82,12 +82,13 @@ AlertAnalysis AnalyzeAlertFile(const std::u16string& path, const std::u16string&
   }
 
   std::u16string category;
+  BodyFieldReader fields(a.body);
   if (component == u"Predefine Alerts") {
     GetSomeInfoFromScriptSubject(a.subject, row.alert_action, row.threshold, row.alert_type, row.alert_name,
                                  category);
     row.component_name = ParseHtmlBodyToGetComponentInfo(a.body, row.alert_action);
     if (row.component_name.empty() && row.alert_name == kDataLeakage) row.component_name = u"Exchange Server";
-    if (row.alert_action == kEmailAlert) row.server_name = ParseHtmlBodyAndGetFieldData(a.body, u"Server");
+    if (row.alert_action == kEmailAlert) row.server_name = fields.FieldData(u"Server");
   } else {
     GetSomeInfoFromScriptSubject(a.subject, row.alert_action, row.threshold, row.alert_type, row.alert_name,
                                  row.component_name, row.server_name, category);
@@ -95,11 +96,11 @@ AlertAnalysis AnalyzeAlertFile(const std::u16string& path, const std::u16string&
 
   if (row.alert_action == kEmailAlert) {
     if (IsActivityCategory(category)) {
-      row.component_name = ParseHtmlBodyAndGetFieldData(a.body, u"Component Name");
-      row.server_name = ParseHtmlBodyAndGetFieldData(a.body, u"Server Name");
+      row.component_name = fields.FieldData(u"Component Name");
+      row.server_name = fields.FieldData(u"Server Name");
     }
-    row.who = ParseHtmlBodyAndGetFieldData(a.body, u"Who");
-    row.operation = ParseHtmlBodyAndGetFieldData(a.body, u"Operation");
+    row.who = fields.FieldData(u"Who");
+    row.operation = fields.FieldData(u"Operation");
     if (row.who.empty() && row.alert_name == kDataLeakage) row.who = a.sender;
   } else if (row.component_name.empty() && IsActivityCategory(category)) {
     row.component_name = ParseHtmlBodyToGetComponentInfo(a.body, row.alert_action);

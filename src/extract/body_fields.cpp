@@ -56,30 +56,38 @@ std::u16string ParseHtmlBodyToGetComponentInfo(std::u16string_view body,
   return {};
 }
 
-std::u16string ParseHtmlBodyAndGetFieldData(std::u16string_view body,
-                                            std::u16string_view fieldName) {
+BodyFieldReader::BodyFieldReader(std::u16string_view body) : body_(body) {}
+
+std::u16string BodyFieldReader::FieldData(std::u16string_view fieldName) {
   WriteLog(u"Inside ParseHtmlBodyAndGetFieldData function");
   std::u16string result;
-  if (body.empty()) return result;
+  if (body_.empty()) return result;
 
-  const int table = GetTableIndex(body);
-  std::vector<std::u16string> headers;
-  std::vector<CRowHtml> rows;
-  GetAllColFromHtmlTable(table, headers, body);
-  GetAllRowFromHtmlTable(table, body, rows);
+  if (!parsed_) {
+    const int table = GetTableIndex(body_);
+    GetAllColFromHtmlTable(table, headers_, body_);
+    GetAllRowFromHtmlTable(table, body_, rows_);
+    parsed_ = true;
+  } else {
+    // The table was read for an earlier field; its readers' lines are written
+    // again so the log reads as if it had been read anew.
+    WriteLog(u"Inside GetTableIndex function");
+    WriteLog(u"Inside GetAllColFromHtmlTable function");
+    WriteLog(u"Inside GetAllRowFromHtmlTable function");
+  }
   WriteLog(u"After calling \"GetAllRowFromHtmlTable\" function");
 
-  std::vector<bool> wanted(headers.size());
-  for (std::size_t i = 0; i < headers.size(); ++i) wanted[i] = Find(headers[i], fieldName) >= 0;
+  std::vector<bool> wanted(headers_.size());
+  for (std::size_t i = 0; i < headers_.size(); ++i) wanted[i] = Find(headers_[i], fieldName) >= 0;
 
   // People's names arrive in whatever case the auditing source wrote them;
   // every other field is compared exactly.
   const bool fold_case = fieldName == u"Who";
   const bool mark_file_server = fieldName == u"File Server";
   std::unordered_set<std::u16string> seen;
-  for (const CRowHtml& row : rows) {
+  for (const CRowHtml& row : rows_) {
     // A short row pairs only the cells it has; extra cells have no header.
-    const std::size_t pairs = std::min(headers.size(), row.cells.size());
+    const std::size_t pairs = std::min(headers_.size(), row.cells.size());
     for (std::size_t i = 0; i < pairs; ++i) {
       if (!wanted[i]) continue;
       const std::u16string& value = row.cells[i];
@@ -90,6 +98,10 @@ std::u16string ParseHtmlBodyAndGetFieldData(std::u16string_view body,
     }
   }
   return result;
+}
+
+std::u16string ParseHtmlBodyAndGetFieldData(std::u16string_view body, std::u16string_view fieldName) {
+  return BodyFieldReader(body).FieldData(fieldName);
 }
 
 }  // namespace asum

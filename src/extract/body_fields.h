@@ -22,6 +22,9 @@
 
 #include <string>
 #include <string_view>
+#include <vector>
+
+#include "extract/html_table.h"
 
 namespace asum {
 
@@ -30,5 +33,20 @@ std::u16string ParseHtmlBodyToGetComponentInfo(std::u16string_view body,
 
 std::u16string ParseHtmlBodyAndGetFieldData(std::u16string_view body,
                                             std::u16string_view fieldName);
+
+// Several field requests over one body, each answered exactly as
+// ParseHtmlBodyAndGetFieldData answers it, log lines included, but with the
+// body's table read only once. The body must outlive the reader. One thread.
+class BodyFieldReader {
+ public:
+  explicit BodyFieldReader(std::u16string_view body);
+  std::u16string FieldData(std::u16string_view fieldName);
+
+ private:
+  std::u16string_view body_;
+  bool parsed_ = false;
+  std::vector<std::u16string> headers_;
+  std::vector<CRowHtml> rows_;
+};
 
 }  // namespace asum

@@ -83,5 +83,28 @@ TEST(ParseHtmlBodyAndGetFieldData, LogLines) {
                    u"Inside ParseHtmlBodyToGetComponentInfo function"}));
 }
 
+TEST(BodyFieldReader, AnswersAndLogsAsSeparateCallsDo) {
+  const std::u16string body =
+      u"<table><tr><th>Who</th><th>Server Name</th><th>File Server</th></tr><tbody>"
+      u"<tr><td>ALICE</td><td>S1</td><td>F1</td></tr><tr><td>alice</td><td>S2</td><td>F1</td></tr></tbody></table>";
+  const std::u16string fields[] = {u"Who", u"Server", u"File Server", u"Nothing", u"Who"};
+  std::vector<std::u16string> separate, together;
+  std::vector<std::u16string> separate_log, together_log;
+  {
+    test::CapturedLog log;
+    for (const auto& f : fields) separate.push_back(ParseHtmlBodyAndGetFieldData(body, f));
+    separate_log = log.Messages();
+  }
+  {
+    test::CapturedLog log;
+    BodyFieldReader reader(body);
+    for (const auto& f : fields) together.push_back(reader.FieldData(f));
+    together_log = log.Messages();
+  }
+  EXPECT_EQ(together, separate);
+  EXPECT_EQ(together_log, separate_log);
+  EXPECT_EQ(together[1], u"S1, F1, S2");
+}
+
 }  // namespace
 }  // namespace asum

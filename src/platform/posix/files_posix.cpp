@@ -74,9 +74,16 @@ bool Env::ListFolder(const std::u16string& folder, const std::u16string& wildcar
     entry.name = FromNative(ent->d_name);
     if (!WildcardMatch(wildcard, entry.name)) continue;
     entry.full_path = prefix + entry.name;
-    struct stat st;
-    const std::string child = native + "/" + ent->d_name;
-    entry.is_folder = ::stat(child.c_str(), &st) == 0 && S_ISDIR(st.st_mode);
+    // The directory entry usually says what it is; only links and file
+    // systems that do not say cost a stat (an idle cycle lists every PROC_
+    // file of every report folder).
+    if (ent->d_type == DT_DIR || ent->d_type == DT_REG) {
+      entry.is_folder = ent->d_type == DT_DIR;
+    } else {
+      struct stat st;
+      const std::string child = native + "/" + ent->d_name;
+      entry.is_folder = ::stat(child.c_str(), &st) == 0 && S_ISDIR(st.st_mode);
+    }
     out->push_back(std::move(entry));
   }
   ::closedir(dir);
