@@ -1,6 +1,11 @@
 #include "collect/process_alerts.h"
 
+#include <condition_variable>
+#include <mutex>
+#include <thread>
+
 #include "collect/alert_message.h"
+#include "common/utf.h"
 #include "collect/when_text.h"
 #include "extract/body_fields.h"
 #include "extract/html_table.h"
@@ -50,6 +55,101 @@ MarkResult MarkProcessed(const std::u16string& path, platform::FileResult* failu
 void LogMarkFailure(const std::u16string& path, const platform::FileResult& failure) {
   WriteLog(path + u" could not be renamed to its PROC_ name: " + failure.Describe());
 }
+
+// Reads and classifies the next file on a helper thread while the current one
+// is stored: the commit waits on the disk and the analysis on a processor, so
+// with two cores a cycle runs at nearly the pace of its commits. The helper's
+// log lines are held back and written when its file's turn comes, so the log
+// reads exactly as if one thread had done everything.
+class AnalysisPipeline {
+ public:
+  AnalysisPipeline(const StringList& files, const std::u16string& status, const std::u16string& component)
+      : files_(files), status_(status), component_(component) {
+    try {
+      worker_ = std::thread([this] { Work(); });
+    } catch (...) {
+      // No thread to be had: every file is analysed in turn on the caller's.
+    }
+  }
+
+  ~AnalysisPipeline() {
+    {
+      std::lock_guard<std::mutex> lock(mutex_);
+      closing_ = true;
+    }
+    changed_.notify_all();
+    if (worker_.joinable()) worker_.join();
+  }
+
+  // The analysis of files[index], taken in order 0, 1, 2, ...; its held-back
+  // log lines are written first. False when it failed (out of memory).
+  bool Next(size_t index, AlertAnalysis* out) {
+    Result result;
+    if (worker_.joinable()) {
+      std::unique_lock<std::mutex> lock(mutex_);
+      changed_.wait(lock, [&] { return ready_; });
+      result = std::move(slot_);
+      ready_ = false;
+      wanted_ = index + 1;
+      lock.unlock();
+      changed_.notify_all();
+    } else {
+      result = Analyze(index);
+    }
+    for (const std::u16string& line : result.log) WriteLog(line);
+    *out = std::move(result.analysis);
+    return result.ok;
+  }
+
+ private:
+  struct Result {
+    AlertAnalysis analysis;
+    std::vector<std::u16string> log;
+    bool ok = false;
+  };
+
+  Result Analyze(size_t index) {
+    Result result;
+    DeferredLog deferred;
+    try {
+      result.analysis = AnalyzeAlertFile(files_[index], status_, component_);
+      result.ok = true;
+    } catch (...) {
+    }
+    result.log = deferred.Take();
+    return result;
+  }
+
+  void Work() {
+    for (size_t index = 0; index < files_.size(); ++index) {
+      {
+        std::unique_lock<std::mutex> lock(mutex_);
+        changed_.wait(lock, [&] { return closing_ || wanted_ >= index; });
+        if (closing_) return;
+      }
+      Result result = Analyze(index);
+      {
+        std::unique_lock<std::mutex> lock(mutex_);
+        changed_.wait(lock, [&] { return closing_ || !ready_; });
+        if (closing_) return;
+        slot_ = std::move(result);
+        ready_ = true;
+      }
+      changed_.notify_all();
+    }
+  }
+
+  const StringList& files_;
+  const std::u16string& status_;
+  const std::u16string& component_;
+  std::mutex mutex_;
+  std::condition_variable changed_;
+  Result slot_;
+  bool ready_ = false;
+  bool closing_ = false;
+  size_t wanted_ = 0;  // the worker analyses files up to this index ahead
+  std::thread worker_;
+};
 
 }  // namespace
 
@@ -150,12 +250,17 @@ void ProcessAlertFiles(const std::u16string& install_folder, StringList& files, 
   }
   WriteLog(u"AlertSummaryDB opened");
 
+  AnalysisPipeline pipeline(files, status, component);
   size_t index = 0;
   for (; index < files.size(); ++index) {
     if (stop != nullptr && stop->Requested()) break;
     const std::u16string& path = files[index];
     try {
-      AlertAnalysis a = AnalyzeAlertFile(path, status, component);
+      AlertAnalysis a;
+      if (!pipeline.Next(index, &a)) {
+        ++t.left;
+        continue;
+      }
       platform::FileResult failure;
       if (a.outcome == AlertOutcome::kLeave) {
         ++t.left;
@@ -181,7 +286,7 @@ void ProcessAlertFiles(const std::u16string& install_folder, StringList& files, 
         ++t.left;
         continue;
       }
-      const std::u16string row_id = store.ExecuteScalar(u"SELECT last_insert_rowid()");
+      const int64_t row_id = store.Connection().LastInsertRowId();
       if (MarkProcessed(path, &failure) != MarkResult::kFailed) {
         WriteLog(path + u"Successfully renamed");
         ++t.stored;
@@ -190,7 +295,7 @@ void ProcessAlertFiles(const std::u16string& install_folder, StringList& files, 
       // The file keeps its name and comes back next cycle; without its row
       // going too, every cycle would store the same alert once more.
       LogMarkFailure(path, failure);
-      if (!row_id.empty() && store.ExecuteQuery(u"DELETE FROM AlertDB WHERE rowid = ?1", {row_id})) {
+      if (row_id > 0 && store.ExecuteQuery(u"DELETE FROM AlertDB WHERE rowid = ?1", {DecimalText(row_id)})) {
         WriteLog(u"Removed the row stored for " + path + u"; it is stored again when the file is processed");
       } else {
         WriteLog(u"Could not remove the row stored for " + path);

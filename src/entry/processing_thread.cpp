@@ -9,11 +9,21 @@ ProcessingThread::ProcessingThread(uint32_t interval_ms, Cycle cycle)
 
 ProcessingThread* ProcessingThread::Start(uint32_t interval_ms, Cycle cycle) {
   auto* thread = new ProcessingThread(interval_ms, std::move(cycle));
-  if (!platform::Current().StartThread(&ProcessingThread::Main, thread)) {
+  // The handle is stored before the thread can be joined: joining starts only
+  // after Start has returned it to the caller.
+  thread->handle_ = platform::Current().StartThread(&ProcessingThread::Main, thread);
+  if (thread->handle_ == nullptr) {
     delete thread;
     return nullptr;
   }
   return thread;
+}
+
+bool ProcessingThread::WaitUntilFinished(uint32_t ms) {
+  if (handle_ == nullptr) return true;
+  if (!platform::Current().JoinThread(handle_, ms)) return false;
+  handle_ = nullptr;
+  return true;
 }
 
 void ProcessingThread::Main(void* self) {
@@ -30,7 +40,6 @@ void ProcessingThread::Main(void* self) {
     }
     thread->cycles_.fetch_add(1);
   }
-  thread->finished_.Request();
 }
 
 }  // namespace asum

@@ -27,8 +27,9 @@ class ProcessingThread {
 
   void RequestStop() { stop_.Request(); }
   bool StopRequested() const { return stop_.Requested(); }
-  // Waits up to `ms` for the loop to end; true when it has ended.
-  bool WaitUntilFinished(uint32_t ms) { return finished_.WaitFor(ms); }
+  // Waits up to `ms` for the thread to end; true when it has ended. Call it
+  // from one thread at a time.
+  bool WaitUntilFinished(uint32_t ms);
   uint64_t CyclesCompleted() const { return cycles_.load(); }
 
  private:
@@ -38,7 +39,7 @@ class ProcessingThread {
   const uint32_t interval_ms_;
   const Cycle cycle_;
   platform::StopSignal stop_;
-  platform::StopSignal finished_;
+  platform::ThreadHandle handle_ = nullptr;
   std::atomic<uint64_t> cycles_{0};
 };
 

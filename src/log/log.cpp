@@ -4,9 +4,22 @@
 #include "platform/platform.h"
 
 namespace asum {
+namespace {
+
+// A plain pointer: nothing to destroy when a thread ends.
+thread_local DeferredLog* t_deferred = nullptr;
+
+}  // namespace
+
+DeferredLog::DeferredLog() : previous_(t_deferred) { t_deferred = this; }
+DeferredLog::~DeferredLog() { t_deferred = previous_; }
 
 void WriteLog(const std::u16string& message) {
   try {
+    if (t_deferred != nullptr) {
+      t_deferred->messages_.push_back(message);
+      return;
+    }
     platform::Env& env = platform::Current();
     const std::u16string folder = platform::LogFolder();
     if (!env.PathExists(folder)) return;

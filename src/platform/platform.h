@@ -77,6 +77,9 @@ struct FileResult {
   std::u16string Describe() const;
 };
 
+// A started thread; null means none.
+using ThreadHandle = void*;
+
 // A held file lock; null means none.
 using FileLock = void*;
 
@@ -176,9 +179,15 @@ class Env {
   virtual void CloseKey(SettingsKey key);
 
   // --- Threads ------------------------------------------------------------
-  // Starts a detached thread running fn(arg). Returns false when none started.
-  // Nothing ever joins it.
-  virtual bool StartThread(void (*fn)(void*), void* arg);
+  // Starts a thread running fn(arg); null when none started. The handle
+  // stays valid until JoinThread returns true; a thread nobody joins simply
+  // runs until the process ends.
+  virtual ThreadHandle StartThread(void (*fn)(void*), void* arg);
+  // Waits up to `ms` for the thread to end (not only its function: on POSIX
+  // nothing of this library runs on it afterwards, so it may be unloaded).
+  // True, and the handle released, when it has ended. Never call it under
+  // the Windows loader lock.
+  virtual bool JoinThread(ThreadHandle thread, uint32_t ms);
   // Keeps this library mapped until the process ends (Windows: the module is
   // pinned, so FreeLibrary cannot unmap code a running thread executes). POSIX
   // stops the thread at unload instead and does nothing here.

@@ -53,6 +53,8 @@ bool CDbSQLite::Open(const std::u16string& path) {
   return true;
 }
 
+int64_t CDbSQLite::LastInsertRowId() const { return db_ == nullptr ? 0 : sqlite3_last_insert_rowid(db_); }
+
 bool CDbSQLite::Close() {
   if (db_ == nullptr) return true;
   sqlite3* db = db_;

@@ -48,6 +48,8 @@ class CDbSQLite {
   // objects stay valid and fail from then on). Always true.
   bool Close();
   bool IsOpen() const { return db_ != nullptr; }
+  // The row id of this connection's last successful insert (0 when none).
+  int64_t LastInsertRowId() const;
 
   // Prepares the first statement of `sql` on this connection. Never null; a
   // text that does not compile (or no open connection) gives a statement whose

@@ -96,9 +96,11 @@ FileResult Env::CreateFolder(const std::u16string& path) {
 }
 
 FileResult Env::RenameNoReplace(const std::u16string& from, const std::u16string& to) {
-  // link + unlink refuses an existing target atomically, as MoveFileW does;
-  // renameat2(RENAME_NOREPLACE) is not available on every file system.
   const std::string src = ToNative(from), dst = ToNative(to);
+  // One atomic step that refuses an existing target, as MoveFileW does.
+  if (::renameat2(AT_FDCWD, src.c_str(), AT_FDCWD, dst.c_str(), RENAME_NOREPLACE) == 0) return {};
+  if (errno != EINVAL && errno != ENOSYS && errno != ENOTSUP) return FromErrno(errno);
+  // File systems without it: link + unlink refuses an existing target too.
   if (::link(src.c_str(), dst.c_str()) == 0) {
     if (::unlink(src.c_str()) == 0) return {};
     const int err = errno;

@@ -2,6 +2,7 @@
 #include <unistd.h>
 
 #include <climits>
+#include <ctime>
 
 #include "platform/posix/posix_util.h"
 
@@ -36,21 +37,30 @@ void* ThreadMain(void* p) {
 
 }  // namespace
 
-bool Env::StartThread(void (*fn)(void*), void* arg) {
+ThreadHandle Env::StartThread(void (*fn)(void*), void* arg) {
   auto* start = new ThreadStart{fn, arg};
-  pthread_attr_t attr;
-  if (pthread_attr_init(&attr) != 0) {
+  auto* thread = new pthread_t;
+  if (pthread_create(thread, nullptr, ThreadMain, start) != 0) {
     delete start;
-    return false;
+    delete thread;
+    return nullptr;
   }
-  pthread_attr_setdetachstate(&attr, PTHREAD_CREATE_DETACHED);
-  pthread_t thread;
-  const int rc = pthread_create(&thread, &attr, ThreadMain, start);
-  pthread_attr_destroy(&attr);
-  if (rc != 0) {
-    delete start;
-    return false;
+  return thread;
+}
+
+bool Env::JoinThread(ThreadHandle handle, uint32_t ms) {
+  if (handle == nullptr) return true;
+  auto* thread = static_cast<pthread_t*>(handle);
+  struct timespec deadline;
+  clock_gettime(CLOCK_REALTIME, &deadline);
+  deadline.tv_sec += ms / 1000;
+  deadline.tv_nsec += static_cast<long>(ms % 1000) * 1000000L;
+  if (deadline.tv_nsec >= 1000000000L) {
+    deadline.tv_sec += 1;
+    deadline.tv_nsec -= 1000000000L;
   }
+  if (pthread_timedjoin_np(*thread, nullptr, &deadline) != 0) return false;
+  delete thread;
   return true;
 }
 

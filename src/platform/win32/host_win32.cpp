@@ -34,14 +34,20 @@ unsigned __stdcall ThreadMain(void* p) {
 
 }  // namespace
 
-bool Env::StartThread(void (*fn)(void*), void* arg) {
+ThreadHandle Env::StartThread(void (*fn)(void*), void* arg) {
   auto* start = new ThreadStart{fn, arg};
   const uintptr_t handle = _beginthreadex(nullptr, 0, ThreadMain, start, 0, nullptr);
   if (handle == 0) {
     delete start;
-    return false;
+    return nullptr;
   }
-  ::CloseHandle(reinterpret_cast<HANDLE>(handle));
+  return reinterpret_cast<HANDLE>(handle);
+}
+
+bool Env::JoinThread(ThreadHandle thread, uint32_t ms) {
+  if (thread == nullptr) return true;
+  if (::WaitForSingleObject(static_cast<HANDLE>(thread), ms) != WAIT_OBJECT_0) return false;
+  ::CloseHandle(static_cast<HANDLE>(thread));
   return true;
 }
 
