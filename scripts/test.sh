@@ -21,6 +21,11 @@ cmake --build build/linux -j"$jobs"
 step "Linux tests"
 (cd build/linux && ctest -j"$jobs" --timeout 300)
 
+step "Sanitizer builds (AddressSanitizer + UBSan: whole suite; ThreadSanitizer: concurrency tests)"
+scripts/sanitize.sh
+step "Fuzz smoke runs"
+FUZZ_SECONDS="${FUZZ_SECONDS:-20}" scripts/fuzz.sh
+
 step "Windows x64 build"
 cmake -S . -B build/win64 -G Ninja -DCMAKE_TOOLCHAIN_FILE=cmake/mingw-w64-x86_64.cmake >/dev/null
 cmake --build build/win64 -j"$jobs"
