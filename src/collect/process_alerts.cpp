@@ -7,6 +7,7 @@
 #include "collect/alert_message.h"
 #include "common/utf.h"
 #include "collect/when_text.h"
+#include "extract/alert_values.h"
 #include "extract/body_fields.h"
 #include "extract/html_table.h"
 #include "extract/subject.h"
@@ -17,9 +18,6 @@
 namespace asum {
 namespace {
 
-constexpr std::u16string_view kEmailAlert = u"Email Alert";
-constexpr std::u16string_view kScriptAlert = u"Script Alert";
-constexpr std::u16string_view kDataLeakage = u"Potential Data Leakage";
 constexpr std::u16string_view kOutsideHours = u"Activity Outside of Business Hours";
 constexpr std::u16string_view kEnvironmentChanges = u"All Environment Changes";
 

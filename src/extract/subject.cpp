@@ -1,5 +1,6 @@
 #include "extract/subject.h"
 
+#include "extract/alert_values.h"
 #include "extract/text_ops.h"
 #include "log/log.h"
 
@@ -9,10 +10,7 @@ namespace {
 
 constexpr std::u16string_view kScriptWords = u"Script Execution";
 constexpr std::u16string_view kThresholdWord = u"Threshold";
-constexpr std::u16string_view kLeakageWords = u"Potential Data Leakage";
 
-constexpr std::u16string_view kEmailAlert = u"Email Alert";
-constexpr std::u16string_view kScriptAlert = u"Script Alert";
 constexpr std::u16string_view kThresholdYes = u"Yes";
 constexpr std::u16string_view kThresholdNo = u"No";
 constexpr std::u16string_view kThresholdNone = u"N\\A";
@@ -39,7 +37,7 @@ void GetSomeInfoFromScriptSubject(std::u16string_view subject, std::u16string& a
   if (subject.empty()) return;
   std::u16string s(subject);
 
-  if (Contains(s, kLeakageWords)) {
+  if (Contains(s, kDataLeakage)) {
     const std::ptrdiff_t c = ReverseFind(s, u':');
     std::u16string type = Left(s, c);
     alertName = Trim(Replace(Mid(s, c + 1), u"!", u""));
