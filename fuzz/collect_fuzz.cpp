@@ -13,13 +13,12 @@
 
 #include "collect/process_alerts.h"
 #include "common/utf.h"
+#include "fuzz_support.h"
 #include "platform/platform.h"
 
 namespace {
 
-void Check(bool ok) {
-  if (!ok) __builtin_trap();
-}
+using asum::fuzz::Check;
 
 // One file per fuzzing process, so parallel jobs never share it.
 const std::filesystem::path& InputFile() {
@@ -47,11 +46,7 @@ void Analyze(const std::u16string& path, const std::u16string& status, const std
 }  // namespace
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
-  static const bool quiet = [] {
-    asum::platform::SetLogFolder(u"no-such-folder-for-the-fuzzer");
-    return true;
-  }();
-  (void)quiet;
+  asum::fuzz::KeepLogOff();
   {
     std::ofstream out(InputFile(), std::ios::binary | std::ios::trunc);
     out.write(reinterpret_cast<const char*>(data), static_cast<std::streamsize>(size));

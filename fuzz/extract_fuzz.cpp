@@ -11,13 +11,12 @@
 #include "extract/html_table.h"
 #include "extract/subject.h"
 #include "extract/text_ops.h"
+#include "fuzz_support.h"
 #include "platform/platform.h"
 
 namespace {
 
-void Check(bool ok) {
-  if (!ok) __builtin_trap();
-}
+using asum::fuzz::Check;
 
 std::u16string Units(const uint8_t* data, size_t size) {
   std::u16string text;
@@ -44,11 +43,7 @@ void TextOps(const std::u16string& text, const std::u16string& marker, std::ptrd
 }  // namespace
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
-  static const bool quiet = [] {
-    asum::platform::SetLogFolder(u"no-such-folder-for-the-fuzzer");
-    return true;
-  }();
-  (void)quiet;
+  asum::fuzz::KeepLogOff();
   if (size < 2) return 0;
   const uint8_t control = data[0];
   const std::u16string all = Units(data + 1, size - 1);

@@ -138,3 +138,12 @@ function(e2e_expect_nothing_lost dir total_files)
   endif()
   message(STATUS "${n_marked} of ${n_all} files marked, ${rows} rows")
 endfunction()
+
+# Fails unless every alert file below `dir` has its PROC_ name.
+function(e2e_expect_all_marked dir)
+  file(GLOB_RECURSE left "${dir}/*.eml*")
+  list(FILTER left EXCLUDE REGEX "/PROC_[^/]*$")
+  if(left)
+    e2e_fail("files left unprocessed: ${left}")
+  endif()
+endfunction()

@@ -35,11 +35,7 @@ if(WINDOWS)
   endif()
 endif()
 
-file(GLOB_RECURSE left "${install}/*.eml*")
-list(FILTER left EXCLUDE REGEX "/PROC_[^/]*$")
-if(left)
-  e2e_fail("files left unprocessed: ${left}")
-endif()
+e2e_expect_all_marked("${install}")
 
 find_program(SQLITE3 sqlite3)
 if(NOT SQLITE3)
