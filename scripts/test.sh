@@ -38,7 +38,14 @@ source .ci/wine-env.sh
 trap wine_stop EXIT
 step "Windows x64 tests (Wine)"
 (cd build/win64 && ctest -j"$jobs" --timeout 300)
-step "Windows x86 tests (Wine)"
-(cd build/win32 && ctest -j"$jobs" --timeout 300)
+if [[ -z "$WINE_X86_SKIP_REASON" ]]; then
+  step "Windows x86 tests (Wine)"
+  (cd build/win32 && ctest -j"$jobs" --timeout 300)
+else
+  step "Windows x86 tests: SKIPPED, $WINE_X86_SKIP_REASON"
+  echo "Only the x86 DLL's export table is checked here; the x86 tests run on a machine that runs 32-bit programs."
+  cmake -DLIBRARY=build/win32/AlertSummary.dll -DOBJDUMP=i686-w64-mingw32-objdump \
+    -DEXPECTED=_Run,_GetAlertCount,_RunRetentionProc -P tests/e2e/exports.cmake
+fi
 
 step "All builds green"
