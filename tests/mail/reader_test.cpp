@@ -119,13 +119,32 @@ TEST(LoadEml, HeaderRulesForSubjectAndFrom) {
   }
 }
 
-TEST(LoadEml, EmptyFirstLineMeansNoHeaderFields) {
-  ClsEmail email;
-  ASSERT_TRUE(email.LoadEmlFromMemory("\r\nSubject: x\r\nFrom: a@b\r\n\r\nbody", DateContext{}));
-  EXPECT_EQ(email.Subject(), u"");
-  EXPECT_EQ(email.FromAddress(), u"");
-  EXPECT_EQ(email.message().date, SystemTime{});
-  EXPECT_EQ(email.Body(), u"Subject: x\r\nFrom: a@b\r\n\r\nbody");
+// The CR LF form of each text is the reference: another line-end form must
+// split in the same place once its line ends are repaired.
+TEST(LoadEml, HeaderEndsAtTheEarliestEmptyLine) {
+  struct Case {
+    const char* text;
+    const char* subject;
+    const char* body;
+  } cases[] = {
+      {"\r\nSubject: x\r\nFrom: a@b\r\n\r\nbody", "", "Subject: x\r\nFrom: a@b\r\n\r\nbody"},
+      {"\nSubject: x\nFrom: a@b\n\nbody", "", "Subject: x\r\nFrom: a@b\r\n\r\nbody"},
+      {"\nSubject: x", "", "Subject: x"},
+      {"\r\r\nSubject: x\r\r\n\r\r\nbody", "", "Subject: x\r\n\r\nbody"},
+      {"\rSubject: x\r\rbody", "", "Subject: x\r\n\r\nbody"},
+      {"Subject: a\r\n\r\r\nbody line\n\nmore", "a", "body line\r\n\r\nmore"},
+      {"Subject: a\r\n\rbody line\n\nmore", "a", "body line\r\n\r\nmore"},
+  };
+  for (const Case& c : cases) {
+    ClsEmail email;
+    ASSERT_TRUE(email.LoadEmlFromMemory(c.text, DateContext{}));
+    EXPECT_EQ(test::Narrow(email.Subject()), c.subject) << c.text;
+    EXPECT_EQ(test::Narrow(email.Body()), c.body) << c.text;
+    if (*c.subject == '\0') {
+      EXPECT_EQ(email.FromAddress(), u"") << c.text;
+      EXPECT_EQ(email.message().date, SystemTime{}) << c.text;
+    }
+  }
 }
 
 struct BodyCase {
