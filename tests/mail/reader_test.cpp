@@ -108,6 +108,8 @@ TEST(LoadEml, HeaderRulesForSubjectAndFrom) {
       {"From: =?utf-8?Q?=3Cevil=40x=3E?= <real@b.c>\r\n", "", "real@b.c"},
       {"From:   bare@b.c  \r\n", "", "bare@b.c"},
       {"From: <only@b.c>\r\n", "", "only@b.c"},
+      {"From: \"john doe\"@b.c (John)\r\n", "", "\"john doe\"@b.c"},
+      {"From: John <\"john doe\"@b.c>\r\n", "", "\"john doe\"@b.c"},
       {"From: team: Name <g@b.c>;\r\n", "", "g@b.c"},
       {"From: \r\n", "", ""},
       {"no colon here\r\nSubject: after junk\r\n", "after junk", ""},
