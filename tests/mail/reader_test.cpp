@@ -219,6 +219,16 @@ TEST(GetBody, FollowsTheRulesInOrder) {
            "Content-Type: multipart/alternative; boundary=XX\r\n\r\n--XX\r\n\r\nfirst\r\n--XX\r\n"
            "Content-Type: text/html\r\n\r\n<last",
        "<last"},
+      {"boundary in RFC 2231 form",
+       "Content-Type: multipart/alternative; boundary*=\"us-ascii''abc\"\r\n\r\n--abc\r\n\r\np\r\n--abc\r\n"
+       "Content-Type: text/html\r\n\r\n<h>\r\n--abc--\r\n",
+       "<h>"},
+      {"charset in RFC 2231 form", "Content-Type: text/plain; charset*=us-ascii'en'koi8-r\r\n\r\n\xF0\xD2\xC9",
+       "\xD0\x9F\xD1\x80\xD0\xB8"},
+      {"file name in RFC 2231 continuations",
+       Multipart("multipart/mixed", Part("Content-Type: text/plain; name*0*=utf-8''key%2E; name*1=pem\r\n", "att") +
+                                        Part("Content-Type: text/plain\r\n", "main")),
+       "main"},
       {"part without an empty line is all content",
        "Content-Type: multipart/mixed; boundary=XX\r\n\r\n--XX\r\nhello\r\n--XX--", "hello"},
   };
