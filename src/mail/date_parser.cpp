@@ -1,5 +1,6 @@
 #include "mail/date_parser.h"
 
+#include <algorithm>
 #include <cstdint>
 #include <iterator>
 #include <string>
@@ -12,6 +13,7 @@ namespace {
 constexpr size_t kMaxRfc822Chars = 199;
 constexpr int kMinutesPerDay = 1440;
 constexpr uint16_t kInvalidField = 0xFFFF;  // out of every range; repaired later
+constexpr int64_t kSaturated = 999999999;   // where a long "%d" number stops growing
 
 struct Zone {
   std::string_view name;
@@ -82,8 +84,10 @@ class Cursor {
     }
     return value;
   }
-  // As "%d" reads: blanks, an optional sign, at least one digit. Very long
-  // numbers saturate instead of overflowing.
+  // As "%d" reads: blanks, an optional sign, at least one digit. A very long
+  // number saturates instead of overflowing, so it stays out of every field's
+  // range and is repaired later; its leading zeros count for nothing, so
+  // "000000000009" is still 9.
   bool Int(int64_t* value) {
     const size_t start = pos_;
     SkipAny(" \t\r\n");
@@ -93,12 +97,16 @@ class Cursor {
       Skip();
     }
     size_t count = 0;
-    int64_t v = Digits(9, &count);
+    int64_t v = 0;
+    while (!AtEnd() && text_[pos_] >= '0' && text_[pos_] <= '9') {
+      v = std::min<int64_t>(v * 10 + (text_[pos_] - '0'), kSaturated);
+      ++pos_;
+      ++count;
+    }
     if (count == 0) {
       pos_ = start;
       return false;
     }
-    while (!AtEnd() && text_[pos_] >= '0' && text_[pos_] <= '9') ++pos_;
     *value = sign * v;
     return true;
   }
@@ -211,6 +219,8 @@ bool DateParser::ParseIso8601(std::string_view text, platform::SystemTime* date)
     c.Skip();
     while (c.Peek() >= '0' && c.Peek() <= '9') c.Skip();
   }
+  // Writers put blanks before the offset as they do in the RFC 822 form.
+  c.SkipAny(" \t");
   int64_t offset = 0;
   if (c.Peek() == '+' || c.Peek() == '-') {
     const int sign = c.Peek() == '-' ? -1 : 1;
@@ -259,6 +269,9 @@ bool DateParser::ParseRfc822(std::string_view full_text, platform::SystemTime* d
   int64_t year = c.Digits(6, &n);
   if (n == 0 || (c.Peek() >= '0' && c.Peek() <= '9')) return false;
   if (year < 1900) year += year >= 50 ? 1900 : 2000;
+  // '-' separates the time from the date as it does the other parts; it is
+  // never the hour's sign.
+  c.SkipAny(" \t-");
 
   int64_t hour = 0;
   int64_t minute = 0;

@@ -48,17 +48,33 @@ std::string BareCrToCrLf(std::string_view text) {
   return out;
 }
 
+// A text that begins with an empty line has no header fields; otherwise the
+// header block ends at the earliest of `ends`. The earliest, not the first
+// kind found: in a text with mixed line ends a later CR LF CR LF must not
+// swallow the body lines before it. At one position the earlier listed (the
+// longer) sequence wins, so CR LF CR never cuts a CR LF CR LF short.
 bool SplitAt(std::string_view text, std::initializer_list<std::string_view> ends, SplitMessage* out) {
-  for (std::string_view end : ends) {
-    const size_t pos = text.find(end);
-    if (pos == std::string_view::npos) continue;
-    // The header block keeps the line end of its last line.
-    out->header = text.substr(0, pos + 2);
-    out->body = text.substr(pos + end.size());
+  if (text.substr(0, 2) == "\r\n") {
+    out->header = {};
+    out->body = text.substr(2);
     out->has_body = true;
     return true;
   }
-  return false;
+  size_t best = std::string_view::npos;
+  std::string_view best_end;
+  for (std::string_view end : ends) {
+    const size_t pos = text.find(end);
+    if (pos < best) {
+      best = pos;
+      best_end = end;
+    }
+  }
+  if (best == std::string_view::npos) return false;
+  // The header block keeps the line end of its last line.
+  out->header = text.substr(0, best + 2);
+  out->body = text.substr(best + best_end.size());
+  out->has_body = true;
+  return true;
 }
 
 }  // namespace
@@ -70,13 +86,12 @@ std::string_view WithoutBom(std::string_view text) {
 
 SplitMessage SplitHeaderAndBody(std::string_view text, std::string* storage) {
   SplitMessage split;
-  if (text.substr(0, 2) == "\r\n") {
-    split.body = text.substr(2);
-    split.has_body = true;
-    return split;
-  }
+  // Each repair below may bring an empty first line to light (LF alone,
+  // CR CR LF, a bare CR), so SplitAt tests for it after every one of them.
+  if (SplitAt(text, {}, &split)) return split;
   const bool crlf_end = text.find("\r\n\r\n") != std::string_view::npos;
-  const bool lf_end = text.find("\n\n") != std::string_view::npos;
+  // A leading LF is an empty first line written with LF line ends.
+  const bool lf_end = text.find("\n\n") != std::string_view::npos || text.substr(0, 1) == "\n";
   if (lf_end) {
     *storage = LfToCrLf(text);
     if (SplitAt(*storage, {"\r\n\r\n", "\r\n\r\r\n", "\r\n\r", "\n\r\n"}, &split)) return split;

@@ -6,15 +6,17 @@
 namespace asum::mail {
 namespace {
 
-// Splits the text into what lies outside comments and quotes (kept, with
-// quoted text unquoted) and the first comment's content.
+// Splits the text into what lies outside comments (kept) and the first
+// comment's content. Quoted text is kept unquoted for a display name, and as
+// written (quotes and escapes included) for an address, whose quoted local
+// part ("john doe"@example.com) is part of the address itself.
 struct Scanned {
   std::string plain;
   std::string first_comment;
   bool has_comment = false;
 };
 
-Scanned Scan(std::string_view text) {
+Scanned Scan(std::string_view text, bool keep_quotes) {
   Scanned out;
   int depth = 0;
   bool quoted = false;
@@ -23,11 +25,11 @@ Scanned Scan(std::string_view text) {
     const char c = text[i];
     if (quoted) {
       if (c == '\\' && i + 1 < text.size()) {
+        if (keep_quotes) out.plain.push_back(c);
         out.plain.push_back(text[++i]);
-      } else if (c == '"') {
-        quoted = false;
       } else {
-        out.plain.push_back(c);
+        quoted = c != '"';
+        if (quoted || keep_quotes) out.plain.push_back(c);
       }
       continue;
     }
@@ -50,6 +52,7 @@ Scanned Scan(std::string_view text) {
     }
     if (c == '"') {
       quoted = true;
+      if (keep_quotes) out.plain.push_back(c);
     } else if (c == '(') {
       depth = 1;
       comment.clear();
@@ -114,11 +117,11 @@ std::optional<Rfc822Address> ParseMailbox(std::string_view value) {
     const size_t close = value.find('>', angle);
     const size_t stop = close == std::string_view::npos || close > end ? end : close;
     mailbox.address = std::string(TrimBlanks(value.substr(angle + 1, stop - angle - 1)));
-    const Scanned name = Scan(value.substr(begin, angle - begin));
+    const Scanned name = Scan(value.substr(begin, angle - begin), false);
     mailbox.name = std::string(TrimBlanks(name.plain));
     if (mailbox.name.empty() && name.has_comment) mailbox.name = std::string(TrimBlanks(name.first_comment));
   } else {
-    const Scanned bare = Scan(value.substr(begin, end - begin));
+    const Scanned bare = Scan(value.substr(begin, end - begin), true);
     mailbox.address = std::string(TrimBlanks(bare.plain));
     if (bare.has_comment) mailbox.name = std::string(TrimBlanks(bare.first_comment));
   }

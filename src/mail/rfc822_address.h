@@ -18,7 +18,8 @@ struct Rfc822Address {
 // The first mailbox of `value` as written in the header (encoded words not
 // yet decoded, so a decoded display name can never change the address).
 // Forms: `Name <addr>`, `"Quoted, Name" <addr>`, `addr (Comment)`, `addr`,
-// `<addr>`, and the same inside a group `team: Name <addr>;`.
+// `<addr>`, and the same inside a group `team: Name <addr>;`. A quoted local
+// part keeps its quotes in every form: `"john doe"@example.com`.
 std::optional<Rfc822Address> ParseMailbox(std::string_view value);
 
 }  // namespace asum::mail

@@ -108,6 +108,8 @@ TEST(LoadEml, HeaderRulesForSubjectAndFrom) {
       {"From: =?utf-8?Q?=3Cevil=40x=3E?= <real@b.c>\r\n", "", "real@b.c"},
       {"From:   bare@b.c  \r\n", "", "bare@b.c"},
       {"From: <only@b.c>\r\n", "", "only@b.c"},
+      {"From: \"john doe\"@b.c (John)\r\n", "", "\"john doe\"@b.c"},
+      {"From: John <\"john doe\"@b.c>\r\n", "", "\"john doe\"@b.c"},
       {"From: team: Name <g@b.c>;\r\n", "", "g@b.c"},
       {"From: \r\n", "", ""},
       {"no colon here\r\nSubject: after junk\r\n", "after junk", ""},
@@ -119,13 +121,32 @@ TEST(LoadEml, HeaderRulesForSubjectAndFrom) {
   }
 }
 
-TEST(LoadEml, EmptyFirstLineMeansNoHeaderFields) {
-  ClsEmail email;
-  ASSERT_TRUE(email.LoadEmlFromMemory("\r\nSubject: x\r\nFrom: a@b\r\n\r\nbody", DateContext{}));
-  EXPECT_EQ(email.Subject(), u"");
-  EXPECT_EQ(email.FromAddress(), u"");
-  EXPECT_EQ(email.message().date, SystemTime{});
-  EXPECT_EQ(email.Body(), u"Subject: x\r\nFrom: a@b\r\n\r\nbody");
+// The CR LF form of each text is the reference: another line-end form must
+// split in the same place once its line ends are repaired.
+TEST(LoadEml, HeaderEndsAtTheEarliestEmptyLine) {
+  struct Case {
+    const char* text;
+    const char* subject;
+    const char* body;
+  } cases[] = {
+      {"\r\nSubject: x\r\nFrom: a@b\r\n\r\nbody", "", "Subject: x\r\nFrom: a@b\r\n\r\nbody"},
+      {"\nSubject: x\nFrom: a@b\n\nbody", "", "Subject: x\r\nFrom: a@b\r\n\r\nbody"},
+      {"\nSubject: x", "", "Subject: x"},
+      {"\r\r\nSubject: x\r\r\n\r\r\nbody", "", "Subject: x\r\n\r\nbody"},
+      {"\rSubject: x\r\rbody", "", "Subject: x\r\n\r\nbody"},
+      {"Subject: a\r\n\r\r\nbody line\n\nmore", "a", "body line\r\n\r\nmore"},
+      {"Subject: a\r\n\rbody line\n\nmore", "a", "body line\r\n\r\nmore"},
+  };
+  for (const Case& c : cases) {
+    ClsEmail email;
+    ASSERT_TRUE(email.LoadEmlFromMemory(c.text, DateContext{}));
+    EXPECT_EQ(test::Narrow(email.Subject()), c.subject) << c.text;
+    EXPECT_EQ(test::Narrow(email.Body()), c.body) << c.text;
+    if (*c.subject == '\0') {
+      EXPECT_EQ(email.FromAddress(), u"") << c.text;
+      EXPECT_EQ(email.message().date, SystemTime{}) << c.text;
+    }
+  }
 }
 
 struct BodyCase {
@@ -198,6 +219,16 @@ TEST(GetBody, FollowsTheRulesInOrder) {
            "Content-Type: multipart/alternative; boundary=XX\r\n\r\n--XX\r\n\r\nfirst\r\n--XX\r\n"
            "Content-Type: text/html\r\n\r\n<last",
        "<last"},
+      {"boundary in RFC 2231 form",
+       "Content-Type: multipart/alternative; boundary*=\"us-ascii''abc\"\r\n\r\n--abc\r\n\r\np\r\n--abc\r\n"
+       "Content-Type: text/html\r\n\r\n<h>\r\n--abc--\r\n",
+       "<h>"},
+      {"charset in RFC 2231 form", "Content-Type: text/plain; charset*=us-ascii'en'koi8-r\r\n\r\n\xF0\xD2\xC9",
+       "\xD0\x9F\xD1\x80\xD0\xB8"},
+      {"file name in RFC 2231 continuations",
+       Multipart("multipart/mixed", Part("Content-Type: text/plain; name*0*=utf-8''key%2E; name*1=pem\r\n", "att") +
+                                        Part("Content-Type: text/plain\r\n", "main")),
+       "main"},
       {"part without an empty line is all content",
        "Content-Type: multipart/mixed; boundary=XX\r\n\r\n--XX\r\nhello\r\n--XX--", "hello"},
   };
