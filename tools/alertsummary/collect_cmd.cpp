@@ -1,7 +1,6 @@
-#include <chrono>
+#include <cstdint>
 #include <cstdio>
 #include <memory>
-#include <thread>
 
 #include "collect/cycle.h"
 #include "collect/process_alerts.h"
@@ -90,9 +89,10 @@ Runner AddCollect(CLI::App& app) {
       return kExitFailure;
     }
     if (options->once) return RunOnce(install, true);
-    const auto pause = std::chrono::milliseconds(static_cast<int64_t>(options->interval * 1000));
+    const auto pause = static_cast<uint32_t>(options->interval * 1000);
+    platform::StopSignal never;  // the tool runs until it is killed, as the service's thread does
     for (;;) {
-      std::this_thread::sleep_for(pause);
+      never.WaitFor(pause);
       const int code = RunOnce(install, false);
       if (code == kExitFailure) return code;
     }
