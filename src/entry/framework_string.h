@@ -51,10 +51,8 @@ inline constexpr int kFreeSlot = 1;
 
 // The parameter as the callee sees it on this architecture.
 #if UINTPTR_MAX > 0xFFFFFFFFu
-inline constexpr bool kPassedByAddress = true;
 using StringArg = char16_t* const*;  // address of the caller's temporary object
 #else
-inline constexpr bool kPassedByAddress = false;
 using StringArg = char16_t*;  // the object itself: its character pointer
 #endif
 

@@ -35,12 +35,12 @@ void GetSomeInfoFromScriptSubject(std::u16string_view subject, std::u16string& a
                                   std::u16string& alertName, std::u16string& category) {
   LogEntry();
   if (subject.empty()) return;
-  std::u16string s(subject);
+  std::u16string rest(subject);
 
-  if (Contains(s, kDataLeakage)) {
-    const std::ptrdiff_t c = ReverseFind(s, u':');
-    std::u16string type = Left(s, c);
-    alertName = Trim(Replace(Mid(s, c + 1), u"!", u""));
+  if (Contains(rest, kDataLeakage)) {
+    const std::ptrdiff_t lastColon = ReverseFind(rest, u':');
+    std::u16string type = Left(rest, lastColon);
+    alertName = Trim(Replace(Mid(rest, lastColon + 1), u"!", u""));
     category = u"Email Sent";
     alertAction = kEmailAlert;
     threshold = kThresholdNone;
@@ -48,17 +48,17 @@ void GetSomeInfoFromScriptSubject(std::u16string_view subject, std::u16string& a
     return;
   }
 
-  const std::ptrdiff_t p = Find(s, u":");
-  if (p >= 0) {
-    const std::u16string prefix = Left(s, p);
+  const std::ptrdiff_t colon = Find(rest, u":");
+  if (colon >= 0) {
+    const std::u16string prefix = Left(rest, colon);
     if (Contains(prefix, kScriptWords)) {
       alertAction = kScriptAlert;
       threshold = kThresholdNone;
-      s = Mid(s, p + 1);
-      const std::ptrdiff_t q = Find(s, u"\"");
-      if (!s.empty() && q >= 0) {
-        alertType = Trim(Left(s, q));
-        s = Mid(s, q + 1);
+      rest = Mid(rest, colon + 1);
+      const std::ptrdiff_t quote = Find(rest, u"\"");
+      if (!rest.empty() && quote >= 0) {
+        alertType = Trim(Left(rest, quote));
+        rest = Mid(rest, quote + 1);
       }
     } else {
       // These subjects put three characters (a blank, a quote, ...) between
@@ -72,19 +72,19 @@ void GetSomeInfoFromScriptSubject(std::u16string_view subject, std::u16string& a
         threshold = kThresholdNo;
         alertType = Trim(Replace(prefix, u"Alert", u""));
       }
-      s = Right(s, Length(s) - p - 4);
+      rest = Right(rest, Length(rest) - colon - 4);
     }
   }
 
   // The quote that ends the name is followed by two characters (a blank and
   // an opening parenthesis) that are dropped with it.
-  const std::ptrdiff_t q = Find(s, u"\"");
-  if (q >= 0) {
-    alertName = Left(s, q);
-    s = Right(s, Length(s) - q - 3);
+  const std::ptrdiff_t quote = Find(rest, u"\"");
+  if (quote >= 0) {
+    alertName = Left(rest, quote);
+    rest = Right(rest, Length(rest) - quote - 3);
   }
   // A subject that ends with its name files the alert under that name.
-  if (s.empty()) category = alertName;
+  if (rest.empty()) category = alertName;
 }
 
 void GetSomeInfoFromScriptSubject(std::u16string_view subject, std::u16string& alertAction,
@@ -93,11 +93,11 @@ void GetSomeInfoFromScriptSubject(std::u16string_view subject, std::u16string& a
                                   std::u16string& serverName, std::u16string& category) {
   LogEntry();
   if (subject.empty()) return;
-  std::u16string s(subject);
+  std::u16string rest(subject);
 
-  const std::ptrdiff_t p = Find(s, u":");
-  if (p >= 0) {
-    const std::u16string_view prefix = LeftView(s, p);
+  const std::ptrdiff_t colon = Find(rest, u":");
+  if (colon >= 0) {
+    const std::u16string_view prefix = LeftView(rest, colon);
     if (Contains(prefix, kScriptWords)) {
       alertAction = kScriptAlert;
       threshold = kThresholdNone;
@@ -108,54 +108,54 @@ void GetSomeInfoFromScriptSubject(std::u16string_view subject, std::u16string& a
       alertAction = kEmailAlert;
       threshold = kThresholdNo;
     }
-    s = Mid(s, p + 1);
+    rest = Mid(rest, colon + 1);
   }
 
-  const std::ptrdiff_t q = Find(s, u"\"");
-  if (!s.empty() && q >= 0) {
-    alertType = Trim(Left(s, q));
-    s = Mid(s, q + 1);
+  const std::ptrdiff_t quote = Find(rest, u"\"");
+  if (!rest.empty() && quote >= 0) {
+    alertType = Trim(Left(rest, quote));
+    rest = Mid(rest, quote + 1);
   }
 
   // The name ends preferably at the quote that opens the "(server...)" tail,
   // so a name that itself holds a quote survives.
-  std::ptrdiff_t r = Find(s, u"\" (");
-  if (r < 0) r = Find(s, u"\"");
-  if (r >= 0) {
-    alertName = Left(s, r);
-    s = Right(s, Length(s) - r - 3);
+  std::ptrdiff_t nameEnd = Find(rest, u"\" (");
+  if (nameEnd < 0) nameEnd = Find(rest, u"\"");
+  if (nameEnd >= 0) {
+    alertName = Left(rest, nameEnd);
+    rest = Right(rest, Length(rest) - nameEnd - 3);
   }
 
-  if (s.empty()) {
+  if (rest.empty()) {
     category = alertName;
     componentName = kThreatModels;
     return;
   }
 
-  const std::ptrdiff_t t = Find(s, u"\\");
-  if (t >= 0) {
-    const std::u16string_view part = LeftView(s, t);
-    const std::ptrdiff_t u = Find(part, u"(");
-    if (u >= 0) {
-      serverName = Left(part, u);
-      componentName = Replace(Replace(MidView(part, u + 1), u"(", u""), u")", u"");
+  const std::ptrdiff_t backslash = Find(rest, u"\\");
+  if (backslash >= 0) {
+    const std::u16string_view part = LeftView(rest, backslash);
+    const std::ptrdiff_t paren = Find(part, u"(");
+    if (paren >= 0) {
+      serverName = Left(part, paren);
+      componentName = Replace(Replace(MidView(part, paren + 1), u"(", u""), u")", u"");
       if (componentName == u"SQL" || componentName == u"SharePoint") componentName += u" Server";
     } else {
       componentName = u"Active Directory, Exchange Server & Group Policy";
     }
-    s = Mid(s, t + 1);
+    rest = Mid(rest, backslash + 1);
   } else {
-    const std::ptrdiff_t v = Find(s, u")");
-    if (v >= 0) {
-      category = Left(s, v);
-      s = Mid(s, v + 1);
+    const std::ptrdiff_t closeParen = Find(rest, u")");
+    if (closeParen >= 0) {
+      category = Left(rest, closeParen);
+      rest = Mid(rest, closeParen + 1);
     }
   }
 
   // The Category is the report path up to its last backslash; a tail with no
   // backslash left clears what the ')' step set.
-  if (!s.empty() && componentName != kThreatModels) {
-    category = Left(s, ReverseFind(s, u'\\'));
+  if (!rest.empty() && componentName != kThreatModels) {
+    category = Left(rest, ReverseFind(rest, u'\\'));
   }
 }
 

@@ -2,6 +2,12 @@
 // LoadEml, get_FromAddress / get_Subject / get_Body / get_LocalDate, Clear,
 // destroy; one facade per file.
 //
+// The reader's four classes: CkEmail (this header) is the facade callers
+// hold; ClsEmail (cls_email.h) is the implementation it owns, which loads a
+// file and answers the getters; Email2 (email2.h) is the parsed message the
+// implementation holds; CkString (ck_string.h) is the result holder the
+// getters fill. The other files of this folder are the steps of loading.
+//
 // One thread at a time per facade; facades share nothing. Nothing thrown
 // escapes any method. LoadEml returns false (keeping the previous message)
 // when the file cannot be read, is a folder, is larger than

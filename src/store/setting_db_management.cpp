@@ -39,7 +39,6 @@ std::u16string CSettingDBManagement::GetAlertSummaryFolder(const std::u16string&
   return folder;
 }
 
-std::u16string CSettingDBManagement::GetAlertSummaryFolder() { return GetAlertSummaryFolder(HostInstallFolder()); }
 
 std::u16string CSettingDBManagement::DatabasePath(const std::u16string& summary_folder) {
   return summary_folder + platform::NativeSeparators(u"\\AlertSummaryDB.db");

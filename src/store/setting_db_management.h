@@ -34,10 +34,8 @@ class CSettingDBManagement {
 
   // `install_folder` + separator (unless empty or already ending in one) +
   // "Alert_Summary"; the folder is created (one level) when missing, and a
-  // failure to create it is ignored. The no-argument form starts from the
-  // host executable's folder.
+  // failure to create it is ignored.
   static std::u16string GetAlertSummaryFolder(const std::u16string& install_folder);
-  static std::u16string GetAlertSummaryFolder();
   // The database file in a database folder: folder + "\AlertSummaryDB.db".
   static std::u16string DatabasePath(const std::u16string& summary_folder);
 
