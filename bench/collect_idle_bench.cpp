@@ -13,6 +13,7 @@
 #include <filesystem>
 #include <fstream>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include "collect/cycle.h"
@@ -57,12 +58,17 @@ std::vector<fs::path> Layout(const fs::path& install, int files) {
 }
 
 // The least any cycle must do: read every name once and find it processed.
+// The name is looked at where the iterator holds it, without a copy.
 size_t BareListing(const std::vector<fs::path>& folders) {
+  const auto has = [](const auto& name, std::string_view text) {
+    return std::search(name.begin(), name.end(), text.begin(), text.end()) != name.end();
+  };
   size_t fresh = 0;
   for (const fs::path& folder : folders) {
     for (const auto& entry : fs::directory_iterator(folder)) {
-      const std::string name = entry.path().filename().string();
-      if (name.find(".eml") != std::string::npos && name.find("PROC_") == std::string::npos) ++fresh;
+      const auto& full = entry.path().native();
+      const auto name = std::basic_string_view<fs::path::value_type>(full).substr(full.find_last_of(fs::path::preferred_separator) + 1);
+      if (has(name, ".eml") && !has(name, "PROC_")) ++fresh;
     }
   }
   return fresh;

@@ -30,12 +30,15 @@ bool HasMarkerFile(platform::Env& env, const std::u16string& path, const std::u1
   return false;
 }
 
-// Lists `folder` with `wildcard` as the framework's directory search does,
-// which refuses a pattern that does not fit its fixed buffer.
+// The framework's directory search refuses a pattern that does not fit its
+// fixed buffer.
+bool PatternFits(const std::u16string& folder, const std::u16string& wildcard) {
+  return folder.size() + 1 + wildcard.size() < kMaxSearchPattern;
+}
+
 std::vector<platform::DirEntry> Search(const std::u16string& folder, const std::u16string& wildcard) {
   std::vector<platform::DirEntry> entries;
-  if (folder.size() + 1 + wildcard.size() >= kMaxSearchPattern) return entries;
-  platform::Current().ListFolder(folder, wildcard, &entries);
+  if (PatternFits(folder, wildcard)) platform::Current().ListFolder(folder, wildcard, &entries);
   return entries;
 }
 
@@ -64,11 +67,12 @@ void GetComponentFolders(const std::u16string& folder, StringList& components) {
 void GetDomainFolders(const std::u16string& report_folder, StringList& files) {
   WriteLog(u"Inside GetDomainFolders function");
   if (report_folder.empty()) return;
-  for (const platform::DirEntry& entry : Search(report_folder, u"*.eml*")) {
-    if (entry.is_folder) continue;
-    if (entry.full_path.find(u"PROC_") != std::u16string::npos) continue;
-    files.push_back(entry.full_path);
-  }
+  // "PROC_" anywhere in the full path skips the file. The separator between
+  // folder and name is no part of "PROC_", so a folder that holds it hides
+  // every file, and otherwise the listing tests each name as it reads it.
+  const std::u16string wildcard = u"*.eml*";
+  if (report_folder.find(u"PROC_") != std::u16string::npos || !PatternFits(report_folder, wildcard)) return;
+  platform::Current().ListFiles(report_folder, wildcard, "PROC_", &files);
 }
 
 std::u16string InstallFolderOf(const std::u16string& executable_path) {

@@ -172,7 +172,7 @@ AlertAnalysis AnalyzeAlertFile(const std::u16string& path, const std::u16string&
   AlertRow& row = a.row;
   row.when = FormatWhen(a.local_date);
   row.email_status = status;
-  row.alert_path = path;
+  row.alert_path = DisplayText(path);
   if (a.subject.empty() || a.body.empty()) {
     WriteLog(u"Alert subject and body are empty.");
     a.outcome = AlertOutcome::kMarkWithout;

@@ -79,6 +79,12 @@ char32_t DecodeUtf8At(std::string_view s, size_t& i, bool* ok) {
   return cp;
 }
 
+bool IsHighSurrogate(char32_t c) { return c >= 0xD800 && c <= 0xDBFF; }
+bool IsLowSurrogate(char32_t c) { return c >= 0xDC00 && c <= 0xDFFF; }
+
+// The lone surrogates that stand for the bytes 0x80..0xFF of a POSIX name.
+constexpr char16_t kEscapedByteBase = 0xDC00;
+
 }  // namespace
 
 std::u16string Utf8ToUtf16(std::string_view utf8) {
@@ -113,6 +119,56 @@ std::string Utf16ToUtf8(std::u16string_view utf16) {
       c = kReplacement;
     }
     AppendUtf8(out, c);
+  }
+  return out;
+}
+
+std::u16string BytesToNativeName(std::string_view bytes) {
+  std::u16string out;
+  out.reserve(bytes.size());
+  size_t i = 0;
+  bool ok = true;
+  while (i < bytes.size()) {
+    const size_t at = i;
+    const char32_t cp = DecodeUtf8At(bytes, i, &ok);
+    // An ill-formed sequence is always left one byte at a time, and that byte
+    // is 0x80 or more: ASCII is never ill-formed.
+    if (ok) {
+      AppendUtf16(out, cp);
+    } else {
+      out.push_back(static_cast<char16_t>(kEscapedByteBase + static_cast<unsigned char>(bytes[at])));
+    }
+  }
+  return out;
+}
+
+std::string NativeNameToBytes(std::u16string_view name) {
+  std::string out;
+  out.reserve(name.size());
+  for (size_t i = 0; i < name.size(); ++i) {
+    char32_t c = name[i];
+    if (IsHighSurrogate(c) && i + 1 < name.size() && IsLowSurrogate(name[i + 1])) {
+      c = 0x10000 + ((c - 0xD800) << 10) + (name[i + 1] - 0xDC00);
+      ++i;
+    } else if (c >= kEscapedByteBase + 0x80 && c <= kEscapedByteBase + 0xFF) {
+      out.push_back(static_cast<char>(c - kEscapedByteBase));
+      continue;
+    } else if (IsHighSurrogate(c) || IsLowSurrogate(c)) {
+      c = kReplacement;
+    }
+    AppendUtf8(out, c);
+  }
+  return out;
+}
+
+std::u16string DisplayText(std::u16string_view text) {
+  std::u16string out(text);
+  for (size_t i = 0; i < out.size(); ++i) {
+    if (IsHighSurrogate(out[i]) && i + 1 < out.size() && IsLowSurrogate(out[i + 1])) {
+      ++i;
+    } else if (IsHighSurrogate(out[i]) || IsLowSurrogate(out[i])) {
+      out[i] = static_cast<char16_t>(kReplacement);
+    }
   }
   return out;
 }

@@ -20,6 +20,21 @@ std::u16string Utf8ToUtf16(std::string_view utf8);
 // UTF-16 to UTF-8. An unpaired surrogate becomes U+FFFD.
 std::string Utf16ToUtf8(std::u16string_view utf16);
 
+// POSIX file names are bytes and need not be UTF-8. A name read from the
+// system keeps each byte that is not part of a well-formed sequence as the
+// lone surrogate U+DC00 + byte (U+DC80..U+DCFF), and NativeNameToBytes turns
+// such a surrogate back into its byte, so a name goes to the system exactly as
+// it came: the file can be opened and renamed. Well-formed names convert as
+// Utf8ToUtf16 and Utf16ToUtf8 do.
+std::u16string BytesToNativeName(std::string_view bytes);
+std::string NativeNameToBytes(std::u16string_view name);
+
+// The one form in which a text that may hold a name is shown or stored (the
+// row's "Alert Path", the diagnostic log, the tool): every unpaired surrogate,
+// so every undecodable byte of a POSIX name, becomes U+FFFD. For a name read
+// from the system this is Utf8ToUtf16 of its bytes.
+std::u16string DisplayText(std::u16string_view text);
+
 // True when the bytes are well-formed UTF-8.
 bool IsValidUtf8(std::string_view bytes);
 

@@ -30,7 +30,8 @@ void WriteLog(const std::u16string& message) {
 
     std::u16string line = timestamp + u'\t';
     line.reserve(line.size() + message.size() + 2);
-    for (char16_t c : message) {
+    // A path of a file whose name is not UTF-8 reads as it does everywhere else.
+    for (char16_t c : DisplayText(message)) {
       if (c == u'\n') line.push_back(u'\r');
       line.push_back(c);
     }

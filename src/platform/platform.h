@@ -7,8 +7,11 @@
 //
 // Paths are UTF-16 texts. The core builds them with `kPathSeparator`; the
 // Windows backend hands them to the wide-character API unchanged, the POSIX
-// backend converts them to UTF-8. On POSIX a backslash is an ordinary character
-// of a name.
+// backend converts them to UTF-8. A POSIX name that is not UTF-8 comes back with
+// each undecodable byte as a lone surrogate and goes out as that byte again
+// (common/utf.h, BytesToNativeName), so every listed file can be opened and
+// renamed; show such paths only through DisplayText. On POSIX a backslash is an
+// ordinary character of a name.
 //
 // Thread safety: every method may be called from any thread at once. `Current()`
 // is read without a lock; tests swap it only while no library thread runs.
@@ -112,6 +115,15 @@ class Env {
   // search cannot start (missing folder, no permission); `out` is then empty.
   virtual bool ListFolder(const std::u16string& folder, const std::u16string& wildcard,
                           std::vector<DirEntry>* out);
+  // Appends to `out` the full path (folder, separator, name) of every file of
+  // `folder`, folders left out, whose name matches `wildcard` as ListFolder
+  // matches and does not contain `skip` (ASCII, compared with case; empty
+  // skips nothing), in the order the search returns them. Each name is
+  // decided on as it is read, and a path is built only for a name that stays:
+  // a folder of many skipped files costs little more than reading their names.
+  // Returns false, appending nothing, when the search cannot start.
+  virtual bool ListFiles(const std::u16string& folder, const std::u16string& wildcard, std::string_view skip,
+                         std::vector<std::u16string>* out);
   // One level; fails when the folder exists.
   virtual FileResult CreateFolder(const std::u16string& path);
   // Renames without replacing (MoveFileW): an existing target gives
@@ -152,7 +164,9 @@ class Env {
   // cannot be converted.
   virtual std::optional<SystemTime> UtcToLocal(const SystemTime& utc);
   // The log's timestamp for a local time: the user's short date, a blank and
-  // the time with seconds. Empty when the time cannot be rendered.
+  // the time with seconds. On POSIX the user's locale is the one the
+  // environment names (LC_ALL, LC_TIME, LANG), in the C form when this machine
+  // has no such locale. Empty when the time cannot be rendered.
   virtual std::u16string TimestampText(const SystemTime& local);
   // OLE Automation dates (days since 1899-12-30, time as the fraction).
   virtual std::optional<double> SystemTimeToVariantTime(const SystemTime& st);

@@ -1,9 +1,14 @@
 #include "collect/discovery.h"
 
 #include <gtest/gtest.h>
+#include <sqlite3.h>
 
 #include <algorithm>
 #include <filesystem>
+#include <fstream>
+
+#include "collect/cycle.h"
+#include "collect/process_alerts.h"
 
 #include "support/test_support.h"
 
@@ -139,6 +144,45 @@ TEST(RunCollectionCycle, FixedNamesFollowMarkerFoldersAndMayStandTwice) {
   EXPECT_EQ(*(anomaly + 1), dir.path());
   EXPECT_EQ(*(anomaly + 2), count_line);
 }
+
+#ifndef _WIN32
+// Linux names are bytes: one that is not UTF-8 is stored and renamed by its
+// exact bytes, and its row and log lines show each bad byte as U+FFFD.
+TEST(RunCollectionCycle, ANameThatIsNotUtf8IsStoredAndMarkedByItsExactBytes) {
+  test::CapturedLog log;
+  TempDir dir;
+  WriteText(dir.Join(u"Comp\\info.dat"), "");
+  const std::u16string sent = dir.Join(u"Comp\\AlertReports\\Sent items");
+  const std::filesystem::path folder(test::Narrow(sent));
+  std::filesystem::create_directories(folder);
+  std::ofstream(folder / "Alert_caf\xe9.eml", std::ios::binary)
+      << "From: alerts@corp.example\r\nSubject: Threshold Alert: File Change \"Mass deletion\" (FS01(File Server)"
+         "\\File Server Changes\\Daily)\r\nContent-Type: text/html\r\n\r\n<p>body</p>";
+  EnsureDatabase(dir.path());
+  const auto cycle = RunLockedCycle(dir.path(), [&](StringList& files, const std::u16string& status,
+                                                    const std::u16string& component) {
+    ProcessAlertFiles(dir.path(), files, status, component);
+  });
+  ASSERT_EQ(cycle, CycleResult::kDone);
+  EXPECT_FALSE(std::filesystem::exists(folder / "Alert_caf\xe9.eml"));
+  EXPECT_TRUE(std::filesystem::exists(folder / "PROC_Alert_caf\xe9.eml"));
+
+  const std::u16string shown = sent + platform::kPathSeparator + u"Alert_caf\uFFFD.eml";
+  sqlite3* db = nullptr;
+  sqlite3_stmt* st = nullptr;
+  ASSERT_EQ(sqlite3_open16(DatabasePathOf(dir.path()).c_str(), &db), SQLITE_OK);
+  ASSERT_EQ(sqlite3_prepare_v2(db, "SELECT \"Alert Path\" FROM AlertDB", -1, &st, nullptr), SQLITE_OK);
+  ASSERT_EQ(sqlite3_step(st), SQLITE_ROW);
+  EXPECT_EQ(reinterpret_cast<const char*>(sqlite3_column_text(st, 0)), test::Narrow(shown));
+  sqlite3_finalize(st);
+  sqlite3_close(db);
+
+  std::u16string logged = shown + u"Successfully renamed";
+  std::replace(logged.begin(), logged.end(), u'\uFFFD', u'?');  // the log holds one byte per character
+  const auto messages = log.Messages();
+  EXPECT_NE(std::find(messages.begin(), messages.end(), logged), messages.end());
+}
+#endif
 
 TEST(InstallFolderOf, CutsAtTheLastSeparator) {
   const std::u16string sep(1, platform::kPathSeparator);

@@ -4,6 +4,11 @@
 #include <windows.h>
 #endif
 
+#include <algorithm>
+#include <filesystem>
+#include <fstream>
+
+#include "common/utf.h"
 #include "platform/platform.h"
 #include "support/test_support.h"
 
@@ -32,14 +37,59 @@ TEST(PlatformFiles, MoveNeverReplacesAndReadRefusesFolders) {
 
 TEST(PlatformFiles, ListFolderMatchesWildcardsIgnoringAsciiCase) {
   test::TempDir dir;
-  for (const char16_t* name : {u"a.eml", u"b.EML", u"c.emlx", u"d.txt", u"eml"}) test::WriteText(dir.Join(name), "");
+  for (const char16_t* name : {u"a.eml", u"b.EML", u"c.emlx", u"d.txt", u"eml", u"PROC_e.eml", u"proc_f.eml"}) {
+    test::WriteText(dir.Join(name), "");
+  }
+  test::MakeFolders(dir.Join(u"folder.eml"));
   std::vector<platform::DirEntry> entries;
   ASSERT_TRUE(platform::Current().ListFolder(dir.path(), u"*.eml*", &entries));
-  EXPECT_EQ(entries.size(), 3u);
+  EXPECT_EQ(entries.size(), 6u);
   ASSERT_TRUE(platform::Current().ListFolder(dir.path(), u"*.*", &entries));
-  EXPECT_EQ(entries.size(), 5u) << "*.* matches names without a dot too";
+  EXPECT_EQ(entries.size(), 8u) << "*.* matches names without a dot too";
   EXPECT_FALSE(platform::Current().ListFolder(dir.Join(u"missing"), u"*.*", &entries));
+
+  std::vector<std::u16string> files{u"kept"};
+  ASSERT_TRUE(platform::Current().ListFiles(dir.path(), u"*.eml*", "PROC_", &files));
+  std::sort(files.begin() + 1, files.end());
+  EXPECT_EQ(files, (std::vector<std::u16string>{u"kept", dir.Join(u"a.eml"), dir.Join(u"b.EML"),
+                                                dir.Join(u"c.emlx"), dir.Join(u"proc_f.eml")}))
+      << "appends files only, and skips names holding PROC_ with case";
+  EXPECT_FALSE(platform::Current().ListFiles(dir.Join(u"missing"), u"*.*", "", &files));
 }
+
+#ifndef _WIN32
+// A name that is not UTF-8 is listed, read and renamed by its exact bytes, and
+// shows each undecodable byte as U+FFFD.
+TEST(PlatformFiles, NamesThatAreNotUtf8GoBackToTheSystemByteForByte) {
+  const struct {
+    std::string bytes;
+    std::u16string shown;
+  } cases[] = {
+      {"Alert_caf\xe9.eml", u"Alert_caf\uFFFD.eml"},
+      {"\xc3\xa9t\xc3\xa9.eml", u"\u00e9t\u00e9.eml"},
+      {"\xf0\x9f\x98\x80\xff.eml", u"\U0001F600\uFFFD.eml"},
+      {"\xed\xb3\xa9.eml", u"\uFFFD\uFFFD\uFFFD.eml"},  // the UTF-8 form of an escape is no escape
+      {"\xc0\xae\xc3(.eml", u"\uFFFD\uFFFD\uFFFD(.eml"},
+  };
+  platform::Env& env = platform::Current();
+  for (const auto& c : cases) {
+    test::TempDir dir;
+    const std::filesystem::path folder(test::Narrow(dir.path()));
+    std::ofstream(folder / c.bytes) << c.bytes;
+    std::vector<std::u16string> files;
+    ASSERT_TRUE(env.ListFiles(dir.path(), u"*.eml*", "PROC_", &files));
+    ASSERT_EQ(files.size(), 1u) << c.bytes;
+    const std::u16string name = files[0].substr(dir.path().size() + 1);
+    EXPECT_EQ(DisplayText(name), c.shown) << c.bytes;
+    EXPECT_EQ(DisplayText(name), Utf8ToUtf16(c.bytes)) << "the form a reader of the bytes gives";
+    std::string read;
+    EXPECT_TRUE(env.ReadFile(files[0], &read, 100).ok()) << c.bytes;
+    EXPECT_EQ(read, c.bytes);
+    EXPECT_TRUE(env.RenameNoReplace(files[0], dir.Join(u"PROC_" + name)).ok()) << c.bytes;
+    EXPECT_TRUE(std::filesystem::exists(folder / ("PROC_" + c.bytes))) << c.bytes;
+  }
+}
+#endif
 
 TEST(PlatformFiles, TheCollectorLockIsExclusive) {
   test::TempDir dir;

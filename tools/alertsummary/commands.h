@@ -3,6 +3,7 @@
 #pragma once
 
 #include <CLI/CLI.hpp>
+#include <filesystem>
 #include <functional>
 #include <string>
 
@@ -32,8 +33,13 @@ void AddCommonOptions(CLI::App& sub, CommonOptions& options, bool with_install_d
 // Applies the log and settings options; returns the absolute install folder.
 std::u16string ApplyCommonOptions(const CommonOptions& options);
 
+// Texts as the user sees them: a path's undecodable bytes as U+FFFD, the
+// form the library stores and logs.
 std::string Utf8(const std::u16string& text);
 std::u16string Utf16(const std::string& text);
+// A path as the library's platform layer spells it, so a Linux name that is
+// not UTF-8 still names its file.
+std::u16string PathText(const std::filesystem::path& path);
 
 // A "YYYY/MM/DD hh:mm:ss" pair in the range text the host passes.
 std::u16string RangeText(const std::string& from, const std::string& to);

@@ -69,9 +69,9 @@ Runner AddInspect(CLI::App& app) {
       const fs::path file = fs::absolute(fs::path(name)).lexically_normal();
       std::string component = options->component, status = options->status;
       DefaultsFromPlace(file, &component, &status);
-      const AlertAnalysis a = AnalyzeAlertFile(file.u16string(), Utf16(status), Utf16(component));
+      const AlertAnalysis a = AnalyzeAlertFile(PathText(file), Utf16(status), Utf16(component));
       nlohmann::ordered_json out;
-      out["file"] = file.string();
+      out["file"] = Utf8(PathText(file));
       out["loaded"] = a.loaded;
       if (a.loaded) {
         out["sender"] = Utf8(a.sender);

@@ -10,8 +10,16 @@
 
 namespace asum::tool {
 
-std::string Utf8(const std::u16string& text) { return Utf16ToUtf8(text); }
+std::string Utf8(const std::u16string& text) { return Utf16ToUtf8(DisplayText(text)); }
 std::u16string Utf16(const std::string& text) { return Utf8ToUtf16(text); }
+
+std::u16string PathText(const std::filesystem::path& path) {
+#ifdef _WIN32
+  return path.u16string();
+#else
+  return BytesToNativeName(path.native());
+#endif
+}
 
 std::u16string RangeText(const std::string& from, const std::string& to) {
   return Utf16("<FROM>" + from + "</FROM><TO>" + to + "</TO>");
@@ -28,11 +36,11 @@ void AddCommonOptions(CLI::App& sub, CommonOptions& options, bool with_install_d
 
 std::u16string ApplyCommonOptions(const CommonOptions& options) {
   namespace fs = std::filesystem;
-  if (!options.log_dir.empty()) platform::SetLogFolder(fs::absolute(fs::path(options.log_dir)).u16string());
+  if (!options.log_dir.empty()) platform::SetLogFolder(PathText(fs::absolute(fs::path(options.log_dir))));
   if (!options.settings_root.empty()) {
-    platform::SetSettingsRoot(fs::absolute(fs::path(options.settings_root)).u16string());
+    platform::SetSettingsRoot(PathText(fs::absolute(fs::path(options.settings_root))));
   }
-  std::u16string install = fs::absolute(fs::path(options.install_dir)).lexically_normal().u16string();
+  std::u16string install = PathText(fs::absolute(fs::path(options.install_dir)).lexically_normal());
   while (install.size() > 1 && install.back() == platform::kPathSeparator) install.pop_back();
   return install;
 }

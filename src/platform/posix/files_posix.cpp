@@ -53,6 +53,47 @@ bool WriteAll(int fd, std::string_view bytes) {
   return true;
 }
 
+// Reads a folder's entries one by one, "." and ".." left out.
+class FolderReader {
+ public:
+  explicit FolderReader(const std::u16string& folder)
+      : native_(ToNative(folder)), dir_(::opendir(native_.empty() ? "." : native_.c_str())) {}
+  ~FolderReader() {
+    if (dir_ != nullptr) ::closedir(dir_);
+  }
+  FolderReader(const FolderReader&) = delete;
+  FolderReader& operator=(const FolderReader&) = delete;
+
+  bool opened() const { return dir_ != nullptr; }
+
+  // The next entry, or null at the end.
+  const struct dirent* Next() {
+    while (const struct dirent* ent = ::readdir(dir_)) {
+      if (std::strcmp(ent->d_name, ".") != 0 && std::strcmp(ent->d_name, "..") != 0) return ent;
+    }
+    return nullptr;
+  }
+
+  // The directory entry usually says what it is; only links and file systems
+  // that do not say cost a stat.
+  bool IsFolder(const struct dirent* ent) const {
+    if (ent->d_type == DT_DIR || ent->d_type == DT_REG) return ent->d_type == DT_DIR;
+    struct stat st;
+    const std::string child = native_ + "/" + ent->d_name;
+    return ::stat(child.c_str(), &st) == 0 && S_ISDIR(st.st_mode);
+  }
+
+ private:
+  std::string native_;
+  DIR* dir_;
+};
+
+std::u16string PrefixOf(const std::u16string& folder) {
+  std::u16string prefix = folder;
+  if (!prefix.empty() && prefix.back() != kPathSeparator) prefix.push_back(kPathSeparator);
+  return prefix;
+}
+
 }  // namespace
 
 bool Env::PathExists(const std::u16string& path) {
@@ -63,30 +104,38 @@ bool Env::PathExists(const std::u16string& path) {
 bool Env::ListFolder(const std::u16string& folder, const std::u16string& wildcard,
                      std::vector<DirEntry>* out) {
   out->clear();
-  const std::string native = ToNative(folder);
-  DIR* dir = ::opendir(native.empty() ? "." : native.c_str());
-  if (dir == nullptr) return false;
-  std::u16string prefix = folder;
-  if (!prefix.empty() && prefix.back() != kPathSeparator) prefix.push_back(kPathSeparator);
-  while (struct dirent* ent = ::readdir(dir)) {
-    if (std::strcmp(ent->d_name, ".") == 0 || std::strcmp(ent->d_name, "..") == 0) continue;
+  FolderReader reader(folder);
+  if (!reader.opened()) return false;
+  const std::u16string prefix = PrefixOf(folder);
+  while (const struct dirent* ent = reader.Next()) {
     DirEntry entry;
     entry.name = FromNative(ent->d_name);
     if (!WildcardMatch(wildcard, entry.name)) continue;
     entry.full_path = prefix + entry.name;
-    // The directory entry usually says what it is; only links and file
-    // systems that do not say cost a stat (an idle cycle lists every PROC_
-    // file of every report folder).
-    if (ent->d_type == DT_DIR || ent->d_type == DT_REG) {
-      entry.is_folder = ent->d_type == DT_DIR;
-    } else {
-      struct stat st;
-      const std::string child = native + "/" + ent->d_name;
-      entry.is_folder = ::stat(child.c_str(), &st) == 0 && S_ISDIR(st.st_mode);
-    }
+    entry.is_folder = reader.IsFolder(ent);
     out->push_back(std::move(entry));
   }
-  ::closedir(dir);
+  return true;
+}
+
+bool Env::ListFiles(const std::u16string& folder, const std::u16string& wildcard, std::string_view skip,
+                    std::vector<std::u16string>* out) {
+  FolderReader reader(folder);
+  if (!reader.opened()) return false;
+  const std::u16string prefix = PrefixOf(folder);
+  while (const struct dirent* ent = reader.Next()) {
+    // An idle cycle meets nothing but skipped names: they are refused on
+    // their bytes, before anything is converted or allocated. An ASCII text
+    // is found in the bytes exactly where it stands in the UTF-16 name, since
+    // neither a multibyte sequence nor an escaped byte holds an ASCII unit.
+    const std::string_view bytes(ent->d_name);
+    if (!skip.empty() && bytes.find(skip) != std::string_view::npos) continue;
+    std::u16string path = prefix;
+    path += FromNative(bytes);
+    if (!WildcardMatch(wildcard, std::u16string_view(path).substr(prefix.size()))) continue;
+    if (reader.IsFolder(ent)) continue;
+    out->push_back(std::move(path));
+  }
   return true;
 }
 

@@ -9,8 +9,9 @@
 
 namespace asum::platform::posix {
 
-inline std::string ToNative(const std::u16string& path) { return Utf16ToUtf8(path); }
-inline std::u16string FromNative(const std::string& path) { return Utf8ToUtf16(path); }
+// Names that are not UTF-8 go both ways unchanged (see BytesToNativeName).
+inline std::string ToNative(std::u16string_view path) { return NativeNameToBytes(path); }
+inline std::u16string FromNative(std::string_view path) { return BytesToNativeName(path); }
 
 inline FileResult FromErrno(int err) {
   FileResult r;

@@ -1,4 +1,6 @@
+#include <locale.h>
 #include <time.h>
+#include <wchar.h>
 
 #include <cmath>
 #include <string>
@@ -98,10 +100,20 @@ std::u16string Env::TimestampText(const SystemTime& local) {
   tm.tm_min = local.minute;
   tm.tm_sec = local.second;
   tm.tm_wday = local.day_of_week;
-  char buffer[128];
-  const size_t n = strftime(buffer, sizeof buffer, "%x %X", &tm);
+  // The user's locale is the environment's (LC_ALL, then LC_TIME, then
+  // LANG), not the process's: a host never calls setlocale, which would leave
+  // every log in the C form. Loaded per line, so a changed environment counts
+  // from the next line on, as on Windows. A name this machine has no locale
+  // for gives the C form. The wide form decodes whatever character set the
+  // locale writes its month names and era in.
+  locale_t locale = newlocale(LC_TIME_MASK, "", static_cast<locale_t>(0));
+  if (locale == static_cast<locale_t>(0)) locale = newlocale(LC_TIME_MASK, "C", static_cast<locale_t>(0));
+  if (locale == static_cast<locale_t>(0)) return {};
+  wchar_t buffer[128];
+  const size_t n = wcsftime_l(buffer, sizeof buffer / sizeof buffer[0], L"%x %X", &tm, locale);
+  freelocale(locale);
   if (n == 0) return {};
-  return posix::FromNative(std::string(buffer, n));
+  return Utf32ToUtf16(std::u32string(buffer, buffer + n));
 }
 
 // The OLE Automation date as VarUdate/SystemTimeToVariantTime define it:

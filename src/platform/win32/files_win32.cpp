@@ -31,6 +31,28 @@ bool Env::ListFolder(const std::u16string& folder, const std::u16string& wildcar
   return true;
 }
 
+bool Env::ListFiles(const std::u16string& folder, const std::u16string& wildcard, std::string_view skip,
+                    std::vector<std::u16string>* out) {
+  std::u16string prefix = folder;
+  if (!prefix.empty() && prefix.back() != u'\\') prefix.push_back(u'\\');
+  WIN32_FIND_DATAW data;
+  HANDLE find = ::FindFirstFileW(W(prefix + wildcard), &data);
+  if (find == INVALID_HANDLE_VALUE) return false;
+  const std::u16string wide_skip(skip.begin(), skip.end());
+  do {
+    // Decided on the search's own buffer: a skipped name costs no copy.
+    const std::u16string_view name(reinterpret_cast<const char16_t*>(data.cFileName), wcslen(data.cFileName));
+    if (name == u"." || name == u"..") continue;
+    if ((data.dwFileAttributes & FILE_ATTRIBUTE_DIRECTORY) != 0) continue;
+    if (!wide_skip.empty() && name.find(wide_skip) != std::u16string_view::npos) continue;
+    std::u16string path = prefix;
+    path += name;
+    out->push_back(std::move(path));
+  } while (::FindNextFileW(find, &data));
+  ::FindClose(find);
+  return true;
+}
+
 FileResult Env::CreateFolder(const std::u16string& path) {
   if (::CreateDirectoryW(W(path), nullptr)) return {};
   return FromLastError(::GetLastError());
