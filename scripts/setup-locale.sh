@@ -10,6 +10,10 @@ if locale -a 2>/dev/null | grep -qix 'de_DE\.utf-\?8'; then
   exit 0
 fi
 if ! command -v localedef >/dev/null 2>&1 || [[ ! -e /usr/share/i18n/locales/de_DE ]]; then
+  if ((EUID != 0)); then
+    echo "setup-locale: not root; as root it would install the package locales and make $locale_name" >&2
+    exit 1
+  fi
   echo "setup-locale: installing locales"
   export DEBIAN_FRONTEND=noninteractive
   apt-get update -q

@@ -53,3 +53,5 @@ for p in "${optional_missing[@]}"; do
   apt-get install -y -q --no-install-recommends "$p" ||
     echo "setup: could not install $p; the tests that need it say that they skip"
 done
+"$(dirname "$0")/setup-locale.sh" ||
+  echo "setup: could not make the de_DE.UTF-8 locale; the log's timestamp test says that it skips"
