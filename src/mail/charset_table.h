@@ -13,7 +13,12 @@ namespace asum::mail {
 
 inline constexpr uint32_t kCodePageUtf8 = 65001;
 inline constexpr uint32_t kCodePageAscii = 20127;
+// These three only name charsets that the reader decodes itself
+// (iso2022jp.h, iso8859_tables.h) and never reach the platform: Windows has no
+// code page for ISO 8859-10 and -14 and installs those for ISO-2022-JP unevenly.
 inline constexpr uint32_t kCodePageIso2022Jp = 50220;
+inline constexpr uint32_t kCodePageIso8859_10 = 28600;
+inline constexpr uint32_t kCodePageIso8859_14 = 28604;
 
 // Letter case, blanks, '-', '_' and surrounding quotes are ignored, so
 // "ISO_8859-1", "iso8859-1" and "Latin1" all name code page 28591.

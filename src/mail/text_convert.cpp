@@ -1,21 +1,26 @@
 #include "mail/text_convert.h"
 
-#include <cstring>
-
 #include "common/utf.h"
 #include "mail/charset_table.h"
+#include "mail/iso2022jp.h"
+#include "mail/iso8859_tables.h"
 #include "platform/platform.h"
 
 namespace asum::mail {
 namespace {
 
+using InvalidBytes = platform::Env::InvalidBytes;
+
 constexpr char kEscape = '\x1b';
+constexpr uint32_t kCodePageShiftJis = 932;
+constexpr uint32_t kCodePageGbk = 936;
+constexpr uint32_t kCodePageGb18030 = 54936;
 // Big texts are converted in slices, so the UTF-16 intermediate never holds
 // more than one slice; slices end after a line feed, which no multibyte code
-// page uses as a trailing byte and after which ISO-2022 text is back in ASCII.
+// page uses as a trailing byte.
 constexpr size_t kSliceBytes = 1 << 20;
 
-std::optional<std::string> ConvertCodePage(std::string_view bytes, uint32_t code_page) {
+std::optional<std::string> ConvertCodePage(std::string_view bytes, uint32_t code_page, InvalidBytes invalid) {
   platform::Env& env = platform::Current();
   std::string out;
   out.reserve(bytes.size() + bytes.size() / 8);
@@ -26,7 +31,7 @@ std::optional<std::string> ConvertCodePage(std::string_view bytes, uint32_t code
       const size_t lf = bytes.find('\n', pos + kSliceBytes);
       end = lf == std::string_view::npos ? bytes.size() : lf + 1;
     }
-    std::optional<std::u16string> wide = env.DecodeCodePage(code_page, bytes.substr(pos, end - pos));
+    std::optional<std::u16string> wide = env.DecodeCodePage(code_page, bytes.substr(pos, end - pos), invalid);
     if (!wide) return std::nullopt;
     out += Utf16ToUtf8(*wide);
     pos = end;
@@ -34,9 +39,47 @@ std::optional<std::string> ConvertCodePage(std::string_view bytes, uint32_t code
   return out;
 }
 
+// The whole of `bytes` read in `code_page`; nothing when they are no text of
+// it or this machine cannot read it.
+std::optional<std::string> Decode(std::string_view bytes, uint32_t code_page) {
+  switch (code_page) {
+    case kCodePageUtf8:
+      if (IsValidUtf8(bytes)) return std::string(bytes);
+      return std::nullopt;
+    case kCodePageAscii:
+      if (IsPlainAscii(bytes)) return std::string(bytes);
+      return std::nullopt;
+    case kCodePageIso2022Jp:
+      if (std::optional<std::string> shift_jis = Iso2022JpToShiftJis(bytes)) {
+        return ConvertCodePage(*shift_jis, kCodePageShiftJis, InvalidBytes::kFail);
+      }
+      return std::nullopt;
+    case kCodePageIso8859_10:
+    case kCodePageIso8859_14:
+      return Iso8859TableToUtf8(code_page, bytes);
+    default:
+      break;
+  }
+  std::optional<std::string> text = ConvertCodePage(bytes, code_page, InvalidBytes::kFail);
+  // Some machines (Wine among them) lack GB18030; its two-byte part, which
+  // is most Chinese text, is GBK.
+  if (!text && code_page == kCodePageGb18030) text = ConvertCodePage(bytes, kCodePageGbk, InvalidBytes::kFail);
+  return text;
+}
+
 std::string Utf8Repaired(std::string_view bytes) {
   if (IsValidUtf8(bytes)) return std::string(bytes);
   return Utf16ToUtf8(Utf8ToUtf16(bytes));
+}
+
+std::string ByHeaderRule(std::string_view bytes) {
+  const uint32_t guess = GuessCodePage(bytes);
+  if (std::optional<std::string> text = Decode(bytes, guess)) return *text;
+  // 7-bit text that is no ISO-2022-JP stays as it is, ESC and all.
+  if (guess == kCodePageIso2022Jp) return std::string(bytes);
+  // The ANSI code page is the last resort: what it cannot read is replaced.
+  if (std::optional<std::string> text = ConvertCodePage(bytes, guess, InvalidBytes::kReplace)) return *text;
+  return Utf8Repaired(bytes);
 }
 
 }  // namespace
@@ -61,23 +104,12 @@ uint32_t GuessCodePage(std::string_view bytes) {
 
 std::string ToUtf8(std::string_view bytes, std::optional<uint32_t> code_page) {
   if (IsPlainAscii(bytes)) return std::string(bytes);
-  // US-ASCII cannot describe 8-bit bytes and UTF-8 that is not valid UTF-8
-  // lies about itself: both get the guess.
-  if (code_page == kCodePageAscii || (code_page == kCodePageUtf8 && !IsValidUtf8(bytes))) {
-    code_page.reset();
+  // A declared charset must read the whole text: one that lies about it
+  // would otherwise turn the part into replacement characters.
+  if (code_page) {
+    if (std::optional<std::string> text = Decode(bytes, *code_page)) return *text;
   }
-  const uint32_t chosen = code_page ? *code_page : GuessCodePage(bytes);
-  if (chosen == kCodePageUtf8) return Utf8Repaired(bytes);
-  if (chosen != kCodePageAscii) {
-    if (std::optional<std::string> converted = ConvertCodePage(bytes, chosen)) return *converted;
-  }
-  // The machine cannot convert this code page (or 8-bit text was guessed as
-  // ASCII, which cannot happen): the ANSI code page, then UTF-8 repair.
-  const uint32_t ansi = platform::Current().AnsiCodePage();
-  if (ansi != chosen) {
-    if (std::optional<std::string> converted = ConvertCodePage(bytes, ansi)) return *converted;
-  }
-  return Utf8Repaired(bytes);
+  return ByHeaderRule(bytes);
 }
 
 }  // namespace asum::mail

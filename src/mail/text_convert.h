@@ -1,9 +1,11 @@
 // Turns 8-bit text of a message (header values, text parts) into UTF-8.
 //
-// Thread-safe; uses platform::Current() for code pages other than UTF-8.
-// Never fails: text that the declared code page cannot convert falls back to
-// the header rule (UTF-8 when the bytes are valid UTF-8, else the system's
-// ANSI code page), so a lying or unknown charset never yields an empty text.
+// Thread-safe; uses platform::Current() for code pages other than UTF-8 and
+// the charsets the reader decodes itself (charset_table.h). Never fails: text
+// that its declared code page cannot read as a whole (a charset that lies, or
+// one this machine lacks) is read by the header rule instead (UTF-8 when the
+// bytes are valid UTF-8, else the system's ANSI code page), so a lying or
+// unknown charset never yields an empty text or replacement characters.
 #pragma once
 
 #include <cstdint>

@@ -173,9 +173,22 @@ class Env {
   virtual std::optional<SystemTime> VariantTimeToSystemTime(double date);
 
   // --- Code pages ---------------------------------------------------------
-  // Decodes 8-bit text of a Windows code page number (1252, 65001, 932, ...).
-  // Empty when this machine cannot convert that code page.
-  virtual std::optional<std::u16string> DecodeCodePage(uint32_t code_page, std::string_view bytes);
+  // What DecodeCodePage does with bytes that are no text of the code page: an
+  // invalid or truncated sequence, or a byte or pair the code page leaves
+  // undefined.
+  enum class InvalidBytes {
+    kFail,     // no text at all, so the caller can try another code page
+    kReplace,  // each becomes U+FFFD (Windows: the code page's own default)
+  };
+  // Decodes 8-bit text of a Windows code page number (1252, 65001, 932, ...),
+  // reading every byte as Windows does: the POSIX backend sets the few bytes
+  // where its converter reads a single-byte code page otherwise (Windows reads
+  // the bytes that 874 and 1250-1258 leave undefined as U+0080-U+009F). Empty
+  // when this machine cannot convert that code page, and with kFail when the
+  // bytes are no text of it. Windows refuses kFail for a few code pages (the
+  // ISO-2022 ones, UTF-7): those give nothing with it.
+  virtual std::optional<std::u16string> DecodeCodePage(uint32_t code_page, std::string_view bytes,
+                                                       InvalidBytes invalid);
   // The system's ANSI code page (GetACP on Windows, 1252 on POSIX).
   virtual uint32_t AnsiCodePage();
 

@@ -2,7 +2,8 @@
 
 namespace asum::platform {
 
-std::optional<std::u16string> Env::DecodeCodePage(uint32_t code_page, std::string_view bytes) {
+std::optional<std::u16string> Env::DecodeCodePage(uint32_t code_page, std::string_view bytes,
+                                                  InvalidBytes invalid) {
   if (bytes.empty()) return std::u16string();
   if (!::IsValidCodePage(code_page) && code_page != 1200 && code_page != 1201) return std::nullopt;
   if (code_page == 1200) {  // UTF-16LE needs no conversion call
@@ -13,16 +14,18 @@ std::optional<std::u16string> Env::DecodeCodePage(uint32_t code_page, std::strin
     }
     return out;
   }
+  // Without the flag Windows replaces what it cannot read and reports nothing.
+  const DWORD flags = invalid == InvalidBytes::kFail ? MB_ERR_INVALID_CHARS : 0;
   std::u16string out;
   // Converted in slices so a length never passes what an int holds.
   size_t pos = 0;
   while (pos < bytes.size()) {
     int len = static_cast<int>(std::min<size_t>(bytes.size() - pos, 1u << 26));
-    const int n = ::MultiByteToWideChar(code_page, 0, bytes.data() + pos, len, nullptr, 0);
+    const int n = ::MultiByteToWideChar(code_page, flags, bytes.data() + pos, len, nullptr, 0);
     if (n <= 0) return std::nullopt;
     const size_t old = out.size();
     out.resize(old + static_cast<size_t>(n));
-    ::MultiByteToWideChar(code_page, 0, bytes.data() + pos, len, reinterpret_cast<wchar_t*>(&out[old]), n);
+    ::MultiByteToWideChar(code_page, flags, bytes.data() + pos, len, reinterpret_cast<wchar_t*>(&out[old]), n);
     pos += static_cast<size_t>(len);
   }
   return out;
