@@ -38,6 +38,8 @@ class CSettingDBManagement {
   // host executable's folder.
   static std::u16string GetAlertSummaryFolder(const std::u16string& install_folder);
   static std::u16string GetAlertSummaryFolder();
+  // The same folder's path, for readers that must not create it.
+  static std::u16string AlertSummaryFolderPath(const std::u16string& install_folder);
   // The database file in a database folder: folder + "\AlertSummaryDB.db".
   static std::u16string DatabasePath(const std::u16string& summary_folder);
 
