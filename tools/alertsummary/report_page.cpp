@@ -24,8 +24,8 @@ constexpr const char* kColors[] = {"#4e79a7", "#f28e2b", "#e15759", "#76b7b2", "
 constexpr double kPlotHeight = 220, kPlotWidth = 900, kLeft = 52, kTop = 14, kBottom = 40;
 constexpr double kMaxSlot = 28, kMinSlot = 1;
 // Bar charts of names.
-constexpr double kNameWidth = 190, kBarMax = 270, kRowHeight = 22, kBarHeight = 14;
-constexpr size_t kNameChars = 30;
+constexpr double kNameWidth = 180, kBarMax = 250, kRowHeight = 22, kBarHeight = 14;
+constexpr size_t kNameChars = 28;
 
 using Ranked = std::vector<std::pair<std::string, uint64_t>>;
 
