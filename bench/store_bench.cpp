@@ -43,8 +43,10 @@ double Median(std::vector<double> v) {
   return v[v.size() / 2];
 }
 
-// Rows spread over 2023 and 2024, alternating the two actions.
-void Fill(const std::u16string& db_path, int rows) {
+// Rows spread over 2023 and 2024, alternating the two actions: each day's
+// rows scattered over the whole table, or, as a service stores them, in the
+// order they came (a month's rows lie together).
+void Fill(const std::u16string& db_path, int rows, bool in_time_order = false) {
   sqlite3* db = nullptr;
   sqlite3_open16(db_path.c_str(), &db);
   sqlite3_exec(db, "BEGIN", nullptr, nullptr, nullptr);
@@ -55,7 +57,7 @@ void Fill(const std::u16string& db_path, int rows) {
   const char* types[] = {"Threshold", "Permission Change", "Logon Failure", "File Deleted"};
   char when[32];
   for (int i = 0; i < rows; ++i) {
-    const int day = i % 730;
+    const int day = in_time_order ? static_cast<int>(int64_t{i} * 730 / rows) : i % 730;
     std::snprintf(when, sizeof when, "%d/%02d/%02d %02d:%02d:%02d", 2023 + day / 365, 1 + (day % 365) / 31 % 12,
                   1 + day % 28, i % 24, i % 60, (i / 7) % 60);
     sqlite3_bind_text(insert, 1, i % 2 ? "Email Alert" : "Script Alert", -1, SQLITE_STATIC);
@@ -115,49 +117,61 @@ double IngestRate(const std::u16string& db_path, int rows, int first) {
   return rows / seconds;
 }
 
+std::u16string NewStore(const fs::path& install) {
+  fs::create_directories(install);
+  const std::u16string db_path =
+      asum::CSettingDBManagement::DatabasePath(asum::CSettingDBManagement::GetAlertSummaryFolder(install.u16string()));
+  asum::CSettingDBManagement store;
+  store.OpenDB(db_path);
+  return db_path;
+}
+
 // The same store twice, the second with the index; counts and ingest rounds
 // alternate between them so both see the same machine.
-void CompareIndex(const fs::path& root, const std::u16string& db_path, int rows, int ingest_rows) {
-  const fs::path indexed_install = root / "indexed";
-  fs::create_directories(indexed_install);
-  const std::u16string indexed_db = asum::CSettingDBManagement::DatabasePath(
-      asum::CSettingDBManagement::GetAlertSummaryFolder(indexed_install.u16string()));
-  fs::copy_file(fs::path(db_path), fs::path(indexed_db), fs::copy_options::overwrite_existing);
-  {
-    asum::CDbSQLite db;
-    db.Open(indexed_db);
-    const auto start = Clock::now();
-    asum::CreateWhenIndex(db);
-    std::printf("index on \"When\" built over %d rows in %.0f ms\n", rows, MsSince(start));
-  }
-  const std::u16string plain_install = fs::path(db_path).parent_path().parent_path().u16string();
-  std::vector<double> plain, indexed;
-  int plain_count = 0, indexed_count = 0;
-  for (int run = 0; run < kCountRuns; ++run) {
-    auto start = Clock::now();
-    plain_count = asum::CountAlerts(plain_install, kFilter, kMonth);
-    plain.push_back(MsSince(start));
-    start = Clock::now();
-    indexed_count = asum::CountAlerts(indexed_install.u16string(), kFilter, kMonth);
-    indexed.push_back(MsSince(start));
-  }
-  if (plain_count != indexed_count) std::printf("counts differ: %d and %d\n", plain_count, indexed_count);
-  const double count_plain = Median(plain), count_indexed = Median(indexed);
-  double plain_rate = 0, indexed_rate = 0;
-  const int per_round = std::max(1, ingest_rows / kIngestRounds);
-  for (int round = 0; round < kIngestRounds; ++round) {
-    plain_rate += IngestRate(db_path, per_round, round * per_round) / kIngestRounds;
-    indexed_rate += IngestRate(indexed_db, per_round, round * per_round) / kIngestRounds;
-  }
+void CompareIndex(const fs::path& root, int rows, int ingest_rows) {
   std::printf("\n%10s  %14s %14s %7s\n", "rows", "without index", "with index", "ratio");
-  std::printf("%10d  %11.2f ms %11.2f ms %7.3f   one-month count (%d alerts)\n", rows, count_plain, count_indexed,
-              count_indexed / count_plain, plain_count);
-  std::printf("%10d  %10.0f r/s %10.0f r/s %7.3f   ingest, one commit per alert (%d rows each)\n", rows, plain_rate,
-              indexed_rate, indexed_rate / plain_rate, per_round * kIngestRounds);
-  std::printf("SUMMARY store | one-month count with / without the When index at %d rows | %.3f\n", rows,
-              count_indexed / count_plain);
-  std::printf("SUMMARY store | ingest rate with / without the When index at %d rows | %.3f\n", rows,
-              indexed_rate / plain_rate);
+  for (const bool in_time_order : {false, true}) {
+    const char* layout = in_time_order ? "stored in time order" : "days scattered";
+    const fs::path plain_install = root / "plain", indexed_install = root / "indexed";
+    const std::u16string plain_db = NewStore(plain_install), indexed_db = NewStore(indexed_install);
+    Fill(plain_db, rows, in_time_order);
+    fs::copy_file(fs::path(plain_db), fs::path(indexed_db), fs::copy_options::overwrite_existing);
+    {
+      asum::CDbSQLite db;
+      db.Open(indexed_db);
+      asum::CreateWhenIndex(db);
+    }
+    std::vector<double> plain, indexed;
+    int plain_count = 0, indexed_count = 0;
+    for (int run = 0; run < kCountRuns; ++run) {
+      auto start = Clock::now();
+      plain_count = asum::CountAlerts(plain_install.u16string(), kFilter, kMonth);
+      plain.push_back(MsSince(start));
+      start = Clock::now();
+      indexed_count = asum::CountAlerts(indexed_install.u16string(), kFilter, kMonth);
+      indexed.push_back(MsSince(start));
+    }
+    if (plain_count != indexed_count) std::printf("counts differ: %d and %d\n", plain_count, indexed_count);
+    const double count_plain = Median(plain), count_indexed = Median(indexed);
+    std::printf("%10d  %11.2f ms %11.2f ms %7.3f   one-month count (%d alerts), %s\n", rows, count_plain,
+                count_indexed, count_indexed / count_plain, plain_count, layout);
+    std::printf("SUMMARY store | one-month count with / without the When index, %s, %d rows | %.3f\n", layout, rows,
+                count_indexed / count_plain);
+    if (in_time_order) {
+      double plain_rate = 0, indexed_rate = 0;
+      const int per_round = std::max(1, ingest_rows / kIngestRounds);
+      for (int round = 0; round < kIngestRounds; ++round) {
+        plain_rate += IngestRate(plain_db, per_round, round * per_round) / kIngestRounds;
+        indexed_rate += IngestRate(indexed_db, per_round, round * per_round) / kIngestRounds;
+      }
+      std::printf("%10d  %10.0f r/s %10.0f r/s %7.3f   ingest, one commit per alert (%d rows each)\n", rows,
+                  plain_rate, indexed_rate, indexed_rate / plain_rate, per_round * kIngestRounds);
+      std::printf("SUMMARY store | ingest rate with / without the When index at %d rows | %.3f\n", rows,
+                  indexed_rate / plain_rate);
+    }
+    fs::remove_all(plain_install);
+    fs::remove_all(indexed_install);
+  }
 }
 
 }  // namespace
@@ -213,12 +227,8 @@ int main(int argc, char** argv) {
                 count_ms / count_bare, purge_ms, bare_purge_ms, purge_ms / bare_purge_ms, ours_result);
     std::printf("SUMMARY store | count / bare at %d rows | %.2f\n", rows, count_ms / count_bare);
     std::printf("SUMMARY store | purge / bare at %d rows | %.2f\n", rows, purge_ms / bare_purge_ms);
-    if (largest) {
-      fs::copy_file(copy, original, fs::copy_options::overwrite_existing);
-      fs::remove(copy);
-      CompareIndex(root, db_path, rows, ingest_rows);
-    }
     fs::remove_all(fs::path(install));
+    if (largest) CompareIndex(root, rows, ingest_rows);
   }
   fs::remove_all(root);
   return 0;
