@@ -74,3 +74,10 @@ audit(0)
 expect_json("${a}" 0 purged)
 expect_json("${a}" ${purged} unsure LENGTH)
 expect_json("${a}" 0 missing LENGTH)
+# A row of an unusable date sorts first, yet proves nothing about what purges removed.
+sqlite(ignored "${db}" "INSERT INTO AlertDB SELECT \"Alert Action\", \"Alert Type\", \"Alert Name\", '-1/-1/-1 -1:-1:-1',
+  \"Threshold\", \"Who\", \"Operation\", \"Component Name\", \"EmailStatus\", \"Server Name\", 'gone.eml' FROM AlertDB LIMIT 1")
+audit(0)
+expect_json("${a}" 0 missing LENGTH)
+expect_json("${a}" ${purged} unsure LENGTH)
+expect_json("${a}" 1 rows_without_file)

@@ -102,8 +102,8 @@ std::vector<ProcessedFile> ProcessedFiles(const std::u16string& install, const s
 }
 
 // What the stored rows say, read in one pass: the endings of their paths
-// (one set per ending length the files need), the oldest "When", and how many
-// rows have no file under either name.
+// (one set per ending length the files need), the oldest dated "When", and
+// how many rows have no file under either name.
 struct RowIndex {
   std::unordered_map<size_t, std::unordered_set<std::u16string>> endings;
   std::optional<std::u16string> oldest_when;
@@ -131,8 +131,11 @@ RowIndex ReadRows(CDbSQLite& db, const std::u16string& install, const std::vecto
   }
   std::unique_ptr<CSqlStatement> rows = db.Statement(u"SELECT \"When\", \"Alert Path\" FROM AlertDB");
   while (rows->NextRow()) {
+    // Only a dated row tells how far purges reached: one of an unusable date
+    // ("-1/-1/-1 -1:-1:-1") sorts first but may have come after the last purge.
     const std::u16string when = rows->ValueString(0);
-    if (!index.oldest_when || when < *index.oldest_when) index.oldest_when = when;
+    const bool dated = !when.empty() && when[0] >= u'0' && when[0] <= u'9';
+    if (dated && (!index.oldest_when || when < *index.oldest_when)) index.oldest_when = when;
     const std::u16string path = rows->ValueString(1);
     const std::u16string normalized = Normalized(path);
     for (auto& [elements, endings] : index.endings) {
