@@ -11,13 +11,13 @@
 #include <unordered_map>
 #include <unordered_set>
 
-#include "collect/cycle.h"
 #include "collect/process_alerts.h"
 #include "commands.h"
 #include "install_view.h"
 #include "platform/platform.h"
 #include "progress.h"
 #include "store/alert_table.h"
+#include "store/busy_budget.h"
 #include "store/retention.h"
 #include "store/retention_settings.h"
 

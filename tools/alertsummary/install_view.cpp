@@ -6,7 +6,6 @@
 #include "collect/discovery.h"
 #include "commands.h"
 #include "platform/platform.h"
-#include "store/busy_budget.h"
 #include "store/database_probe.h"
 #include "store/setting_db_management.h"
 

@@ -10,7 +10,7 @@
 #include "install_view.h"
 #include "platform/platform.h"
 #include "store/alert_table.h"
-#include "store/database_probe.h"
+#include "store/busy_budget.h"
 #include "store/retention.h"
 #include "store/retention_settings.h"
 #include "store/when_index.h"
