@@ -103,6 +103,24 @@ TEST(PlatformFiles, TheCollectorLockIsExclusive) {
   env.UnlockFile(again);
 }
 
+// status asks whether a collector works without becoming one: the probe
+// sees a holder, releases at once, and never creates the lock file.
+TEST(PlatformFiles, TheLockProbeSeesAHolderAndCreatesNothing) {
+  test::TempDir dir;
+  platform::Env& env = platform::Current();
+  const std::u16string path = dir.Join(u"x.lock");
+  EXPECT_FALSE(env.FileLockHeld(path));
+  EXPECT_FALSE(env.PathExists(path));
+  platform::FileLock held = env.TryLockFile(path);
+  ASSERT_NE(held, nullptr);
+  EXPECT_TRUE(env.FileLockHeld(path));
+  env.UnlockFile(held);
+  EXPECT_FALSE(env.FileLockHeld(path));
+  held = env.TryLockFile(path);
+  EXPECT_NE(held, nullptr) << "the probe left the lock taken";
+  env.UnlockFile(held);
+}
+
 #ifdef _WIN32
 // The service still writing a message holds it open for writing; the reader's
 // open refuses writers, so the half-written file is left for the next cycle.

@@ -154,6 +154,25 @@ TEST_F(RetentionTest, SettingValuesOfAnyShapeGiveANumberOrTheDefault) {
   EXPECT_EQ(RunRetentionProc(dir_.install()), 1);
 }
 
+// The support tool's status reads the settings where a person may only read:
+// it finds what the purge finds, and creates no key on the way.
+TEST_F(RetentionTest, ReadingForStatusCreatesNoKey) {
+  struct Case {
+    const char16_t* value;  // null: no key at all
+    std::u16string read;
+  } cases[] = {{nullptr, u"15 Days"}, {u"30 Days", u"30 Days"}, {u"", u""}};
+  for (const Case& c : cases) {
+    if (c.value == nullptr) {
+      settings_.Remove(kRetentionDaysSetting);
+    } else {
+      settings_.SetString(kRetentionDaysSetting, c.value);
+    }
+    EXPECT_EQ(ReadRetentionSetting(kRetentionDaysSetting, kRetentionDaysDefault), c.read);
+    EXPECT_EQ(settings_.KeyExists(kRetentionDaysSetting), c.value != nullptr) << test::Narrow(c.read);
+    EXPECT_EQ(GetRetentionSetting(kRetentionDaysSetting, kRetentionDaysDefault), c.read);
+  }
+}
+
 TEST_F(RetentionTest, UnusableDatabasesGiveZero) {
   settings_.SetString(u"Sch_Retention", u"TRUE");
   {

@@ -93,6 +93,9 @@ void SeededSettings::SetNonString(const std::u16string& name, uint32_t) {
   MakeFolders(file);
 }
 void SeededSettings::Remove(const std::u16string& name) { RemoveTree(SettingFolder(root_.path(), name)); }
+bool SeededSettings::KeyExists(const std::u16string& name) const {
+  return platform::Current().PathExists(SettingFolder(root_.path(), name));
+}
 
 #else
 
@@ -147,6 +150,14 @@ void SeededSettings::Remove(const std::u16string& name) {
   std::wstring path = std::wstring(kSuite) + L"\\" + W(name);
   RegDeleteTreeW(HKEY_LOCAL_MACHINE, path.c_str());
   RegDeleteKeyW(HKEY_LOCAL_MACHINE, path.c_str());
+}
+
+bool SeededSettings::KeyExists(const std::u16string& name) const {
+  std::wstring path = std::wstring(kSuite) + L"\\" + W(name);
+  HKEY key = nullptr;
+  const bool exists = RegOpenKeyExW(HKEY_LOCAL_MACHINE, path.c_str(), 0, KEY_READ, &key) == ERROR_SUCCESS;
+  if (key != nullptr) RegCloseKey(key);
+  return exists;
 }
 
 #endif

@@ -64,6 +64,8 @@ class SeededSettings {
   // folder in the value's place, which cannot be read as text).
   void SetNonString(const std::u16string& name, uint32_t number);
   void Remove(const std::u16string& name);
+  // Whether the setting's own key exists.
+  bool KeyExists(const std::u16string& name) const;
 
  private:
 #ifndef _WIN32
