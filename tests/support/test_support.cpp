@@ -15,6 +15,14 @@ namespace fs = std::filesystem;
 namespace asum::test {
 namespace {
 
+// Test programs never write into the service's own log folder: the
+// end-to-end tests switch it on and read it, and a cycle run by a test program
+// beside them would add its lines. A test that reads the log captures it.
+const bool kServiceLogOff = [] {
+  platform::SetLogFolder(u"");
+  return true;
+}();
+
 fs::path ToPath(const std::u16string& p) { return fs::path(p); }
 std::u16string FromPath(const fs::path& p) { return p.u16string(); }
 
