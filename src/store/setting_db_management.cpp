@@ -49,9 +49,17 @@ bool CSettingDBManagement::OpenDB(const std::u16string& path) {
   const bool existed = platform::Current().PathExists(path);
   const bool opened = db_.Open(path);
   WriteLog(u"Inside OpenDB function: " + path);
-  if (!existed) return db_.Statement(CreateAlertTableSql())->Execute();
+  if (!existed) return CreateTable() || (opened && HasAlertTable());
   if (opened) CreateMissingTable(path);
   return opened;
+}
+
+bool CSettingDBManagement::CreateTable() { return db_.Statement(CreateAlertTableSql())->Execute(); }
+
+bool CSettingDBManagement::HasAlertTable() {
+  std::unique_ptr<CSqlStatement> probe =
+      db_.Statement(u"SELECT count(*) FROM sqlite_master WHERE type = 'table' AND name = 'AlertDB'");
+  return probe->NextRow() && probe->ValueString(0) == u"1";
 }
 
 void CSettingDBManagement::CreateMissingTable(const std::u16string& path) {
@@ -62,7 +70,7 @@ void CSettingDBManagement::CreateMissingTable(const std::u16string& path) {
       db_.Statement(u"SELECT count(*) FROM sqlite_master WHERE type = 'table' AND name = 'AlertDB'");
   if (!probe->NextRow() || probe->ValueString(0) != u"0") return;
   probe.reset();
-  const bool created = db_.Statement(CreateAlertTableSql())->Execute();
+  const bool created = CreateTable();
   WriteLog(u"AlertDB table missing in " + path + (created ? u"; created it" : u"; could not create it"));
 }
 

@@ -43,9 +43,10 @@ class CSettingDBManagement {
 
   // Opens the file, logging "Inside OpenDB function: " + path. A file that did
   // not exist before gets the AlertDB table (the result is then that of the
-  // CREATE TABLE). An existing database without the table (left empty by a
-  // crash during its creation) gets it too, with a log line; a file that is
-  // not a database is opened and left untouched.
+  // CREATE TABLE, except that a table another caller created meanwhile, two
+  // first callers racing, counts as created). An existing database without
+  // the table (left empty by a crash during its creation) gets it too, with a
+  // log line; a file that is not a database is opened and left untouched.
   bool OpenDB(const std::u16string& path);
   bool CloseDB();
 
@@ -70,6 +71,8 @@ class CSettingDBManagement {
   CDbSQLite& Connection() { return db_; }
 
  private:
+  bool CreateTable();
+  bool HasAlertTable();
   void CreateMissingTable(const std::u16string& path);
 
   CDbSQLite db_;

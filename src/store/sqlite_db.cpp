@@ -5,6 +5,8 @@
 #include <algorithm>
 #include <chrono>
 
+#include "common/utf.h"
+
 namespace asum {
 namespace {
 
@@ -43,6 +45,19 @@ bool CDbSQLite::Open(const std::u16string& path) {
   const std::u16string file = UpToFirstNul(path);
   sqlite3* db = nullptr;
   const int rc = sqlite3_open16(file.c_str(), &db);
+  return Adopt(rc, db);
+}
+
+bool CDbSQLite::OpenReadOnly(const std::u16string& path) {
+  Close();
+  // The flags exist only on the UTF-8 entry point.
+  const std::string file = Utf16ToUtf8(UpToFirstNul(path));
+  sqlite3* db = nullptr;
+  const int rc = sqlite3_open_v2(file.c_str(), &db, SQLITE_OPEN_READONLY, nullptr);
+  return Adopt(rc, db);
+}
+
+bool CDbSQLite::Adopt(int rc, sqlite3* db) {
   if (rc != SQLITE_OK) {
     // SQLite may hand back a connection even when the open failed; it is ours to release.
     if (db != nullptr) sqlite3_close(db);
@@ -99,7 +114,8 @@ CSqlStatement::CSqlStatement(const std::u16string& sql, CDbSQLite* owner) : owne
   if (owner->db_ == nullptr) return;
   // The legacy interface, to the text's first zero, without a tail: whatever
   // follows the first statement is ignored.
-  if (sqlite3_prepare16(owner->db_, sql.c_str(), -1, &stmt_, nullptr) != SQLITE_OK) {
+  last_code_ = sqlite3_prepare16(owner->db_, sql.c_str(), -1, &stmt_, nullptr);
+  if (last_code_ != SQLITE_OK) {
     if (stmt_ != nullptr) sqlite3_finalize(stmt_);
     stmt_ = nullptr;
   }
@@ -119,7 +135,7 @@ bool CSqlStatement::BindText(int index, const std::u16string& value) {
 
 bool CSqlStatement::Execute() {
   if (stmt_ == nullptr) return false;
-  const int rc = sqlite3_step(stmt_);
+  const int rc = last_code_ = sqlite3_step(stmt_);
   if (rc == SQLITE_ROW || rc == SQLITE_DONE) {
     sqlite3_reset(stmt_);
     return true;
@@ -129,11 +145,13 @@ bool CSqlStatement::Execute() {
 
 bool CSqlStatement::NextRow() {
   if (stmt_ == nullptr) return false;
-  const int rc = sqlite3_step(stmt_);
+  const int rc = last_code_ = sqlite3_step(stmt_);
   if (rc == SQLITE_ROW) return true;
   if (rc == SQLITE_DONE) sqlite3_reset(stmt_);
   return false;
 }
+
+bool CSqlStatement::FoundNotADatabase() const { return last_code_ == SQLITE_NOTADB; }
 
 std::u16string CSqlStatement::ValueString(int column) {
   value_.clear();

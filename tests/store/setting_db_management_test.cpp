@@ -5,6 +5,7 @@
 #include <algorithm>
 
 #include "store/alert_table.h"
+#include "store/retention.h"
 #include "store_test_support.h"
 
 namespace asum {
@@ -69,6 +70,47 @@ TEST(OpenDB, ExistingDatabaseWithoutTheTableGetsIt) {
   const auto messages = log.Messages();
   EXPECT_EQ(std::count(messages.begin(), messages.end(), u"AlertDB table missing in " + dir.db_path() + u"; created it"),
             1);
+}
+
+// Two first callers on a fresh install both find no file; the second one's
+// CREATE TABLE then fails. Here the other caller makes file and table right
+// after this caller's look.
+class RacedFirstCall : public platform::Env {
+ public:
+  explicit RacedFirstCall(std::u16string db) : db_(std::move(db)) {}
+  bool PathExists(const std::u16string& path) override {
+    const bool exists = Env::PathExists(path);
+    if (path == db_ && !raced_) {
+      raced_ = true;
+      test::RawConnection other(db_);
+      EXPECT_EQ(other.Exec(test::Narrow(CreateAlertTableSql()).c_str()), SQLITE_OK);
+    }
+    return exists;
+  }
+
+ private:
+  std::u16string db_;
+  bool raced_ = false;
+};
+
+TEST(OpenDB, TwoFirstCallersBothSucceed) {
+  struct Case {
+    const char* caller;
+    int (*call)(const StoreDir& dir);
+  };
+  const Case cases[] = {
+      {"OpenDB", [](const StoreDir& dir) { return static_cast<int>(CSettingDBManagement().OpenDB(dir.db_path())); }},
+      {"purge", [](const StoreDir& dir) { return DeleteOldAlerts(dir.install(), u"2001/01/01 00:00:00"); }},
+  };
+  for (const Case& c : cases) {
+    SCOPED_TRACE(c.caller);
+    StoreDir dir;
+    CSettingDBManagement::GetAlertSummaryFolder(dir.install());
+    RacedFirstCall raced(dir.db_path());
+    platform::ScopedEnv scope(&raced);
+    EXPECT_EQ(c.call(dir), 1);
+    EXPECT_EQ(dir.RowCount(), 0) << "the table is there";
+  }
 }
 
 TEST(OpenDB, UnusableFilesFailWithoutCrashing) {
