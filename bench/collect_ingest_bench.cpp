@@ -246,10 +246,8 @@ RunFigures RunCycle(const std::u16string& install, const RowsByPath& rows, BareI
   asum::platform::ScopedEnv scoped(&env);
   const double bare_before = bare != nullptr ? bare->seconds() : 0;
   const auto start = Clock::now();
-  const asum::CycleResult result = asum::RunLockedCycle(
-      install, [&](asum::StringList& files, const std::u16string& status, const std::u16string& component) {
-        asum::ProcessAlertFiles(install, files, status, component, nullptr, &f.tally);
-      });
+  asum::CycleContext cycle;
+  const asum::CycleResult result = asum::RunProcessingCycle(install, cycle, &f.tally);
   f.cycle_seconds = SecondsSince(start) - (bare != nullptr ? bare->seconds() - bare_before : 0);
   if (result != asum::CycleResult::kDone) std::printf("the cycle did not run (%d)\n", static_cast<int>(result));
   return f;

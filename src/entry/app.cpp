@@ -38,10 +38,8 @@ void BEProcessSuccessfulAlerts::ProcessAlertFiles(StringList* strListofFilePaths
 }
 
 void RunLibraryCycle(const platform::StopSignal& stop) {
-  const std::u16string install = InstallFolderOf(platform::Current().ExecutablePath());
-  RunLockedCycle(install, [&](StringList& files, const std::u16string& status, const std::u16string& component) {
-    ProcessAlertFiles(install, files, status, component, &stop);
-  });
+  CycleContext cycle(&stop);
+  RunProcessingCycle(InstallFolderOf(platform::Current().ExecutablePath()), cycle);
 }
 
 }  // namespace asum
