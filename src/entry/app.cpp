@@ -6,12 +6,24 @@
 
 namespace asum {
 
-COvranticApp& TheApp() {
-  // Leaked on purpose: a destructor that ran at process exit could meet the
-  // thread mid-cycle. Nothing in it needs tearing down.
-  static COvranticApp* app = new COvranticApp;
-  return *app;
-}
+namespace {
+
+// Storage that is never destroyed: a destructor that ran at process exit could
+// meet the thread mid-cycle, and nothing in the object needs tearing down.
+union AppStorage {
+  constexpr AppStorage() : app() {}
+  ~AppStorage() {}
+  COvranticApp app;
+};
+
+// Built by the compiler, not by code that runs at load: on Windows that code
+// would run under the loader lock, where nothing may take a lock or start a
+// thread. So the object exists from the moment the library is mapped.
+constinit AppStorage g_app;
+
+}  // namespace
+
+COvranticApp& TheApp() { return g_app.app; }
 
 void* BEProcessSuccessfulAlerts::GetSuccAlertsInfo() {
   WriteLog(u"Inside HANDLE BEProcessSuccessfulAlerts::GetSuccAlertsInfo()");

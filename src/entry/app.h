@@ -1,6 +1,7 @@
 // The library's application object and its processing object.
 //
-// Exactly one COvranticApp exists, a global built when the library loads. Its
+// Exactly one COvranticApp exists, a global that exists from the moment the
+// library loads (built by the compiler: no code runs for it at load). Its
 // processing object starts the processing thread on the first `_Run` and hands
 // back the same thread on every later one: two threads over the same folders
 // would store every alert twice.
@@ -15,6 +16,7 @@ namespace asum {
 
 class BEProcessSuccessfulAlerts {
  public:
+  constexpr BEProcessSuccessfulAlerts() = default;
   virtual ~BEProcessSuccessfulAlerts() = default;
 
   // Starts the processing thread (or returns the running one). The result is
@@ -37,6 +39,7 @@ class BEProcessSuccessfulAlerts {
 
 class COvranticApp {
  public:
+  constexpr COvranticApp() = default;
   virtual ~COvranticApp() = default;
   bool InitInstance() { return true; }
   BEProcessSuccessfulAlerts& Processor() { return m_processor; }
