@@ -1,5 +1,7 @@
 #include "entry/app.h"
 
+#include <mutex>
+
 #include "collect/cycle.h"
 #include "collect/process_alerts.h"
 #include "log/log.h"
@@ -21,13 +23,21 @@ union AppStorage {
 // thread. So the object exists from the moment the library is mapped.
 constinit AppStorage g_app;
 
+// Keeps starting and stopping the thread apart. Not a member: a mutex cannot
+// be built by the compiler everywhere (MinGW's needs code), so it is made on
+// first use, which is never at load, and kept for the life of the process.
+std::mutex& StartStopMutex() {
+  static std::mutex* mutex = new std::mutex;
+  return *mutex;
+}
+
 }  // namespace
 
 COvranticApp& TheApp() { return g_app.app; }
 
 void* BEProcessSuccessfulAlerts::GetSuccAlertsInfo() {
   WriteLog(u"Inside HANDLE BEProcessSuccessfulAlerts::GetSuccAlertsInfo()");
-  std::lock_guard<std::mutex> lock(mutex_);
+  std::lock_guard<std::mutex> lock(StartStopMutex());
   if (m_hThread == nullptr || m_hThread->StopRequested()) {
     platform::Current().HoldLibraryLoaded();
     m_hThread = ProcessingThread::Start(kCycleIntervalMs, RunLibraryCycle);
@@ -36,7 +46,7 @@ void* BEProcessSuccessfulAlerts::GetSuccAlertsInfo() {
 }
 
 bool BEProcessSuccessfulAlerts::StopProcessing(uint32_t ms) {
-  std::lock_guard<std::mutex> lock(mutex_);
+  std::lock_guard<std::mutex> lock(StartStopMutex());
   if (m_hThread == nullptr) return true;
   m_hThread->RequestStop();
   return m_hThread->WaitUntilFinished(ms);

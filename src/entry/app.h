@@ -7,8 +7,6 @@
 // would store every alert twice.
 #pragma once
 
-#include <mutex>
-
 #include "collect/discovery.h"
 #include "entry/processing_thread.h"
 
@@ -33,7 +31,6 @@ class BEProcessSuccessfulAlerts {
                          std::u16string strComponentFolder);
 
  private:
-  std::mutex mutex_;
   ProcessingThread* m_hThread = nullptr;  // the thread reference; never freed
 };
 
