@@ -53,6 +53,8 @@ class CSettingDBManagement {
   // Up to seven attempts, each compiling the text afresh and binding
   // `params` to ?1, ?2, ...; logs "Inside ExecuteQuery function - Status: "
   // and "success" or "failure" after the first. True when an attempt ran.
+  // (The statement of the last call is kept for the next call of the same
+  // text; that changes nothing but the time a repeated statement takes.)
   bool ExecuteQuery(const std::u16string& sql, const std::vector<std::u16string>& params = {});
   // One attempt: column 0 of the first row, or empty.
   std::u16string ExecuteScalar(const std::u16string& sql, const std::vector<std::u16string>& params = {});
@@ -76,6 +78,9 @@ class CSettingDBManagement {
   void CreateMissingTable(const std::u16string& path);
 
   CDbSQLite db_;
+  // The statement ExecuteQuery ran last, and its text; gone before db_ goes.
+  std::unique_ptr<CSqlStatement> kept_;
+  std::u16string kept_sql_;
 };
 
 // The log line's text after the first attempt of ExecuteQuery.

@@ -128,9 +128,10 @@ CSqlStatement::~CSqlStatement() {
 
 bool CSqlStatement::BindText(int index, const std::u16string& value) {
   if (stmt_ == nullptr) return false;
-  const std::u16string text = UpToFirstNul(value);
-  const auto bytes = static_cast<int>(std::min<size_t>(text.size() * sizeof(char16_t), 0x7FFFFFF0));
-  return sqlite3_bind_text16(stmt_, index, text.data(), bytes, SQLITE_TRANSIENT) == SQLITE_OK;
+  // SQLite copies the text up to its first zero; no copy of our own first.
+  const size_t length = std::min(value.find(u'\0'), value.size());
+  const auto bytes = static_cast<int>(std::min<size_t>(length * sizeof(char16_t), 0x7FFFFFF0));
+  return sqlite3_bind_text16(stmt_, index, value.data(), bytes, SQLITE_TRANSIENT) == SQLITE_OK;
 }
 
 bool CSqlStatement::Execute() {
