@@ -36,15 +36,15 @@ std::u16string ScriptAlertWho(const std::u16string& body) {
 
 enum class MarkResult { kRenamed, kDeleted, kFailed };
 
-// Gives a file its PROC_ name, or deletes it when that name is taken.
+// Gives a file its PROC_ name, or deletes it when that name is taken. The
+// rename refuses a taken name, so it is tried first: the existence test is
+// needed only when it fails (a folder of that name may give another error).
 MarkResult MarkProcessed(const std::u16string& path, platform::FileResult* failure) {
   platform::Env& env = platform::Current();
   const std::u16string target = ProcName(path);
-  if (!env.PathExists(target)) {
-    *failure = env.RenameNoReplace(path, target);
-    if (failure->ok()) return MarkResult::kRenamed;
-    if (failure->status != platform::FileStatus::kAlreadyExists) return MarkResult::kFailed;
-  }
+  *failure = env.RenameNoReplace(path, target);
+  if (failure->ok()) return MarkResult::kRenamed;
+  if (failure->status != platform::FileStatus::kAlreadyExists && !env.PathExists(target)) return MarkResult::kFailed;
   *failure = env.RemoveFile(path);
   return failure->ok() ? MarkResult::kDeleted : MarkResult::kFailed;
 }
@@ -71,9 +71,11 @@ bool KeepRowOfUnmarkedFile(CSettingDBManagement& store, int64_t row_id, const st
   return false;
 }
 
-// Reads and classifies the next file on a helper thread while the current one
+// Reads and classifies the next files on a helper thread while the current one
 // is stored: the commit waits on the disk and the analysis on a processor, so
-// with two cores a cycle runs at nearly the pace of its commits.
+// with two cores a cycle runs at nearly the pace of its commits. The helper
+// keeps a few files ahead, so that one slow file, or a moment in which a busy
+// machine gives it no processor, does not hold up the commits.
 //
 // Only while the log is off. The log wants each line written as it happens,
 // on the processing thread, so that the last file it names is the one in
@@ -103,53 +105,55 @@ class LookAhead {
   // failed (out of memory).
   bool Take(size_t index, AlertAnalysis* out) {
     const bool log_on = LogEnabled();
+    const bool ahead = !log_on && !cycle_.StopRequested();
     Result result;
-    if (thread_ != nullptr && ahead_ == index) {
+    if (thread_ != nullptr) {
       std::unique_lock<std::mutex> lock(mutex_);
-      changed_.wait(lock, [&] { return ready_; });
-      result = std::move(slot_);
-      ready_ = false;
-      ahead_ = kNone;
+      if (!log_on) changed_.wait(lock, [&] { return busy_ != index; });
+      for (Result& ready : ready_) {
+        if (ready.index == index && !log_on) result = std::move(ready);
+      }
+      std::erase_if(ready_, [&](const Result& ready) { return log_on || ready.index <= index; });
+      next_ = log_on ? index + 1 : std::max(next_, index + 1);
+      end_ = ahead ? std::min(index + 1 + kAhead, files_.size()) : next_;
+      lock.unlock();
+      changed_.notify_all();
+    } else if (ahead && index + 1 < files_.size() && !failed_to_start_) {
+      next_ = index + 1;
+      end_ = std::min(index + 1 + kAhead, files_.size());
+      thread_ = platform::Current().StartThread(&LookAhead::Main, this);
+      failed_to_start_ = thread_ == nullptr;
     }
-    if (log_on || !result.ok) result = Analyze(index);
-    if (!log_on && index + 1 < files_.size() && !cycle_.StopRequested()) Ask(index + 1);
+    if (!result.ok) result = Analyze(index);
     *out = std::move(result.analysis);
     return result.ok;
   }
 
  private:
   static constexpr size_t kNone = static_cast<size_t>(-1);
+  static constexpr size_t kAhead = 3;
   static constexpr uint32_t kJoinMs = 60000;
 
   struct Result {
+    size_t index = kNone;
     AlertAnalysis analysis;
     bool ok = false;
   };
 
   Result Analyze(size_t index) const {
     Result result;
+    result.index = index;
     try {
       result.analysis = AnalyzeAlertFile(files_[index], status_, component_);
+      // Only the row and the outcome are needed; the message's texts go on
+      // the thread that made them rather than on the one that commits.
+      result.analysis.sender = std::u16string();
+      result.analysis.subject = std::u16string();
+      result.analysis.body = std::u16string();
       result.ok = true;
     } catch (...) {
     }
     return result;
-  }
-
-  // Has the helper analyse files[index]; without a helper to be had, the
-  // file is analysed in its turn instead.
-  void Ask(size_t index) {
-    if (thread_ == nullptr && !failed_to_start_) {
-      thread_ = platform::Current().StartThread(&LookAhead::Main, this);
-      failed_to_start_ = thread_ == nullptr;
-    }
-    if (thread_ == nullptr) return;
-    {
-      std::lock_guard<std::mutex> lock(mutex_);
-      ahead_ = index;
-      wanted_ = index;
-    }
-    changed_.notify_all();
   }
 
   static void Main(void* self) { static_cast<LookAhead*>(self)->Work(); }
@@ -158,15 +162,18 @@ class LookAhead {
     SilencedLog silenced;
     std::unique_lock<std::mutex> lock(mutex_);
     for (;;) {
-      changed_.wait(lock, [&] { return closing_ || wanted_ != kNone; });
+      changed_.wait(lock, [&] { return closing_ || next_ < end_; });
       if (closing_) break;
-      const size_t index = wanted_;
-      wanted_ = kNone;
+      busy_ = next_++;
       lock.unlock();
-      Result result = Analyze(index);
+      Result result = Analyze(busy_);
       lock.lock();
-      slot_ = std::move(result);
-      ready_ = true;
+      busy_ = kNone;
+      try {
+        ready_.push_back(std::move(result));
+      } catch (...) {
+        // Out of memory: the file is analysed again in its turn.
+      }
       changed_.notify_all();
     }
     finished_ = true;
@@ -179,13 +186,13 @@ class LookAhead {
   const CycleContext& cycle_;
   platform::ThreadHandle thread_ = nullptr;
   bool failed_to_start_ = false;
-  size_t ahead_ = kNone;  // the file the helper was given and this side has not taken yet
 
   std::mutex mutex_;
   std::condition_variable changed_;
-  size_t wanted_ = kNone;  // the file the helper is to analyse next
-  Result slot_;
-  bool ready_ = false;
+  size_t next_ = 0;        // the file the helper analyses next
+  size_t end_ = 0;         // ... as long as it is below this
+  size_t busy_ = kNone;    // the file the helper is analysing
+  std::vector<Result> ready_;  // analysed, not taken yet
   bool closing_ = false;
   bool finished_ = false;
 };
