@@ -65,15 +65,23 @@ std::u16string DecodeHtmlNumericEntities(std::u16string_view text) {
   while (from < text.size()) {
     const std::size_t semicolon = text.find(u';', from);
     if (semicolon == kNone) break;  // the tail after the last ';' is dropped
-    number.clear();
-    for (std::size_t i = from; i < semicolon; ++i) {
-      if (text.substr(i, kReferenceOpen.size()) == kReferenceOpen) {
-        ++i;
-        continue;
+    const std::u16string_view piece = text.substr(from, semicolon - from);
+    std::u16string_view digits;
+    if (piece.starts_with(kReferenceOpen) && piece.find(kReferenceOpen, kReferenceOpen.size()) == kNone) {
+      // The usual "&#" and digits: read where they stand.
+      digits = piece.substr(kReferenceOpen.size());
+    } else {
+      number.clear();
+      for (std::size_t i = 0; i < piece.size(); ++i) {
+        if (piece.substr(i, kReferenceOpen.size()) == kReferenceOpen) {
+          ++i;
+          continue;
+        }
+        number.push_back(piece[i]);
       }
-      number.push_back(text[i]);
+      digits = number;
     }
-    const uint32_t code = static_cast<uint32_t>(WcstolBase10(number));
+    const uint32_t code = static_cast<uint32_t>(WcstolBase10(digits));
     result.push_back(static_cast<char16_t>(code & 0xFFFFu));
     from = semicolon + 1;
   }
