@@ -131,7 +131,13 @@ TEST(ExecuteQuery, LogsFirstOutcomeAndRetriesSevenTimesInAll) {
   test::CapturedLog log;
   EXPECT_TRUE(store.ExecuteQuery(u"DELETE FROM AlertDB"));
   EXPECT_FALSE(store.ExecuteQuery(u"DELETE FROM nothing"));
-  EXPECT_EQ(log.Messages(), (std::vector<std::u16string>{ExecuteQueryStatusLine(true), ExecuteQueryStatusLine(false)}));
+  // The same text again, after another program changed the schema: the
+  // statement kept from the first run is stale, and the run still succeeds.
+  EXPECT_TRUE(store.ExecuteQuery(u"DELETE FROM AlertDB"));
+  EXPECT_EQ(test::RawConnection(dir.db_path()).Exec("CREATE TABLE other (x)"), SQLITE_OK);
+  EXPECT_TRUE(store.ExecuteQuery(u"DELETE FROM AlertDB"));
+  EXPECT_EQ(log.Messages(), (std::vector<std::u16string>{ExecuteQueryStatusLine(true), ExecuteQueryStatusLine(false),
+                                                         ExecuteQueryStatusLine(true), ExecuteQueryStatusLine(true)}));
   EXPECT_EQ(ExecuteQueryStatusLine(false), u"Inside ExecuteQuery function - Status: failure");
 }
 
