@@ -30,7 +30,9 @@ class BusyBudget {
   uint32_t RemainingMs() const {
     return Exhausted() ? 0 : static_cast<uint32_t>(total_ms_ - spent_ms_);
   }
-  void Charge(uint64_t ms) { spent_ms_ += ms; }
+  // A wait that overran what was left is charged only that: the budget counts
+  // the waiting it granted, so what it spent never exceeds its total.
+  void Charge(uint64_t ms) { spent_ms_ = ms >= RemainingMs() ? total_ms_ : spent_ms_ + ms; }
 
  private:
   uint32_t total_ms_;

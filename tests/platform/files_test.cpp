@@ -33,6 +33,12 @@ TEST(PlatformFiles, MoveNeverReplacesAndReadRefusesFolders) {
   EXPECT_FALSE(env.ReadFile(dir.Join(u"folder.eml"), &bytes, 1000).ok());
   EXPECT_EQ(env.ReadFile(b, &bytes, 0).status, FileStatus::kTooLarge);
   EXPECT_EQ(env.ReadFile(dir.Join(u"missing"), &bytes, 10).status, FileStatus::kNotFound);
+
+  uint64_t size = 7;
+  EXPECT_TRUE(env.FileSize(b, &size).ok());
+  EXPECT_EQ(size, 1u);
+  EXPECT_EQ(env.FileSize(dir.Join(u"folder.eml"), &size).status, FileStatus::kIsFolder);
+  EXPECT_EQ(env.FileSize(dir.Join(u"missing"), &size).status, FileStatus::kNotFound);
 }
 
 TEST(PlatformFiles, ListFolderMatchesWildcardsIgnoringAsciiCase) {
@@ -91,16 +97,23 @@ TEST(PlatformFiles, NamesThatAreNotUtf8GoBackToTheSystemByteForByte) {
 }
 #endif
 
-TEST(PlatformFiles, TheCollectorLockIsExclusive) {
+TEST(PlatformFiles, TheCollectorLockIsExclusiveAndSaysWhyItFailed) {
   test::TempDir dir;
   platform::Env& env = platform::Current();
-  platform::FileLock first = env.TryLockFile(dir.Join(u"x.lock"));
+  platform::FileResult failure;
+  platform::FileLock first = env.TryLockFile(dir.Join(u"x.lock"), &failure);
   ASSERT_NE(first, nullptr);
-  EXPECT_EQ(env.TryLockFile(dir.Join(u"x.lock")), nullptr);
+  EXPECT_EQ(env.TryLockFile(dir.Join(u"x.lock"), &failure), nullptr);
+  EXPECT_EQ(failure.status, FileStatus::kSharingViolation);
   env.UnlockFile(first);
-  platform::FileLock again = env.TryLockFile(dir.Join(u"x.lock"));
+  platform::FileLock again = env.TryLockFile(dir.Join(u"x.lock"), &failure);
   EXPECT_NE(again, nullptr);
   env.UnlockFile(again);
+  // A folder in the lock file's place cannot be opened: not a held lock.
+  test::MakeFolders(dir.Join(u"folder.lock"));
+  EXPECT_EQ(env.TryLockFile(dir.Join(u"folder.lock"), &failure), nullptr);
+  EXPECT_FALSE(failure.ok());
+  EXPECT_NE(failure.status, FileStatus::kSharingViolation);
 }
 
 // status asks whether a collector works without becoming one: the probe

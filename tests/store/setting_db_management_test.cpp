@@ -5,6 +5,7 @@
 #include <algorithm>
 
 #include "store/alert_table.h"
+#include "store/retention.h"
 #include "store_test_support.h"
 
 namespace asum {
@@ -71,6 +72,47 @@ TEST(OpenDB, ExistingDatabaseWithoutTheTableGetsIt) {
             1);
 }
 
+// Two first callers on a fresh install both find no file; the second one's
+// CREATE TABLE then fails. Here the other caller makes file and table right
+// after this caller's look.
+class RacedFirstCall : public platform::Env {
+ public:
+  explicit RacedFirstCall(std::u16string db) : db_(std::move(db)) {}
+  bool PathExists(const std::u16string& path) override {
+    const bool exists = Env::PathExists(path);
+    if (path == db_ && !raced_) {
+      raced_ = true;
+      test::RawConnection other(db_);
+      EXPECT_EQ(other.Exec(test::Narrow(CreateAlertTableSql()).c_str()), SQLITE_OK);
+    }
+    return exists;
+  }
+
+ private:
+  std::u16string db_;
+  bool raced_ = false;
+};
+
+TEST(OpenDB, TwoFirstCallersBothSucceed) {
+  struct Case {
+    const char* caller;
+    int (*call)(const StoreDir& dir);
+  };
+  const Case cases[] = {
+      {"OpenDB", [](const StoreDir& dir) { return static_cast<int>(CSettingDBManagement().OpenDB(dir.db_path())); }},
+      {"purge", [](const StoreDir& dir) { return DeleteOldAlerts(dir.install(), u"2001/01/01 00:00:00"); }},
+  };
+  for (const Case& c : cases) {
+    SCOPED_TRACE(c.caller);
+    StoreDir dir;
+    CSettingDBManagement::GetAlertSummaryFolder(dir.install());
+    RacedFirstCall raced(dir.db_path());
+    platform::ScopedEnv scope(&raced);
+    EXPECT_EQ(c.call(dir), 1);
+    EXPECT_EQ(dir.RowCount(), 0) << "the table is there";
+  }
+}
+
 TEST(OpenDB, UnusableFilesFailWithoutCrashing) {
   StoreDir dir;
   test::WriteText(dir.db_path(), std::string(4096, 'j'));  // not a database
@@ -89,7 +131,13 @@ TEST(ExecuteQuery, LogsFirstOutcomeAndRetriesSevenTimesInAll) {
   test::CapturedLog log;
   EXPECT_TRUE(store.ExecuteQuery(u"DELETE FROM AlertDB"));
   EXPECT_FALSE(store.ExecuteQuery(u"DELETE FROM nothing"));
-  EXPECT_EQ(log.Messages(), (std::vector<std::u16string>{ExecuteQueryStatusLine(true), ExecuteQueryStatusLine(false)}));
+  // The same text again, after another program changed the schema: the
+  // statement kept from the first run is stale, and the run still succeeds.
+  EXPECT_TRUE(store.ExecuteQuery(u"DELETE FROM AlertDB"));
+  EXPECT_EQ(test::RawConnection(dir.db_path()).Exec("CREATE TABLE other (x)"), SQLITE_OK);
+  EXPECT_TRUE(store.ExecuteQuery(u"DELETE FROM AlertDB"));
+  EXPECT_EQ(log.Messages(), (std::vector<std::u16string>{ExecuteQueryStatusLine(true), ExecuteQueryStatusLine(false),
+                                                         ExecuteQueryStatusLine(true), ExecuteQueryStatusLine(true)}));
   EXPECT_EQ(ExecuteQueryStatusLine(false), u"Inside ExecuteQuery function - Status: failure");
 }
 
