@@ -122,14 +122,15 @@ TEST(PlatformFiles, TheLockProbeSeesAHolderAndCreatesNothing) {
   test::TempDir dir;
   platform::Env& env = platform::Current();
   const std::u16string path = dir.Join(u"x.lock");
+  platform::FileResult failure;
   EXPECT_FALSE(env.FileLockHeld(path));
   EXPECT_FALSE(env.PathExists(path));
-  platform::FileLock held = env.TryLockFile(path);
+  platform::FileLock held = env.TryLockFile(path, &failure);
   ASSERT_NE(held, nullptr);
   EXPECT_TRUE(env.FileLockHeld(path));
   env.UnlockFile(held);
   EXPECT_FALSE(env.FileLockHeld(path));
-  held = env.TryLockFile(path);
+  held = env.TryLockFile(path, &failure);
   EXPECT_NE(held, nullptr) << "the probe left the lock taken";
   env.UnlockFile(held);
 }
