@@ -11,7 +11,7 @@
 #include <random>
 #include <string>
 
-#include "collect/process_alerts.h"
+#include "collect/alert_analysis.h"
 #include "common/utf.h"
 #include "fuzz_support.h"
 #include "platform/platform.h"

@@ -1,11 +1,28 @@
 #include "collect/cycle.h"
 
+#include "common/utf.h"
 #include "log/log.h"
 #include "platform/platform.h"
 #include "store/database_probe.h"
 #include "store/setting_db_management.h"
 
 namespace asum {
+namespace {
+
+using platform::NativeSeparators;
+
+void WalkReportFolder(const std::u16string& report_folder, const char16_t* status,
+                      const std::u16string& component, StringList& files,
+                      const AlertFileProcessor& process) {
+  files.clear();
+  GetDomainFolders(report_folder, files);
+  WriteLog(u"After calling GetDomainFolders Function: " + report_folder + u" path contains " +
+           DecimalText(static_cast<int64_t>(files.size())) + u" file(s).");
+  if (!files.empty()) process(files, status, component);
+}
+
+}  // namespace
+
 
 std::u16string DatabasePathOf(const std::u16string& install_folder) {
   return CSettingDBManagement::DatabasePath(CSettingDBManagement::GetAlertSummaryFolder(install_folder));
@@ -17,6 +34,36 @@ std::u16string CollectorLockPathOf(const std::u16string& install_folder) {
 
 std::u16string CollectorLockPathIn(const std::u16string& summary_folder) {
   return summary_folder + platform::NativeSeparators(u"\\AlertSummaryDB.collector.lock");
+}
+
+void RunCollectionCycle(const std::u16string& install_folder, const AlertFileProcessor& process,
+                        const platform::StopSignal* stop) {
+  const auto stopped = [stop] { return stop != nullptr && stop->Requested(); };
+  platform::Env& env = platform::Current();
+  StringList components;
+  GetComponentFolders(install_folder, components);
+  for (const char16_t* name : kFixedComponentFolders) {
+    if (!env.PathExists(install_folder + platform::kPathSeparator + name)) continue;
+    components.push_back(name);
+    if (std::u16string(name) == u"Anomaly Alerts") {
+      WriteLog(u"Anomaly Alerts");
+      WriteLog(install_folder);
+    }
+  }
+  WriteLog(u"After calling GetDomainFolders Function: " + install_folder + u" path contains " +
+           DecimalText(static_cast<int64_t>(components.size())) + u" Component(s).");
+
+  StringList files;
+  for (const std::u16string& name : components) {
+    const std::u16string component = install_folder + platform::kPathSeparator + name;
+    if (!env.PathExists(component + NativeSeparators(u"\\AlertReports"))) continue;
+    const std::u16string sent = component + NativeSeparators(u"\\AlertReports\\Sent items");
+    if (stopped()) return;
+    if (env.PathExists(sent)) WalkReportFolder(sent, u"Delivered", name, files, process);
+    const std::u16string outbox = component + NativeSeparators(u"\\AlertReports\\Outbox");
+    if (stopped()) return;
+    if (env.PathExists(outbox)) WalkReportFolder(outbox, u"Failed", name, files, process);
+  }
 }
 
 CycleResult RunLockedCycle(const std::u16string& install_folder, const AlertFileProcessor& process,

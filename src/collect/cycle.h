@@ -1,16 +1,28 @@
-// One collection cycle as the library's thread and the command-line tool run
-// it: under the install folder's collector lock, so that the service and a
-// support person's tool never process the same files at once.
+// One collection cycle: the walk over an install folder's report folders, and
+// the cycle as the library's thread and the command-line tool run it: under
+// the install folder's collector lock, so that the service and a support
+// person's tool never process the same files at once.
 //
 // Runs on the calling thread; never throws.
 #pragma once
 
+#include <functional>
 #include <string>
 
 #include "collect/discovery.h"
 #include "collect/process_alerts.h"
 
 namespace asum {
+
+// Receives one non-empty list of alert files, its status text ("Delivered" or
+// "Failed") and the component folder's name.
+using AlertFileProcessor =
+    std::function<void(StringList& files, const std::u16string& status, const std::u16string& component)>;
+
+// One collection cycle over `install_folder`. A stop request (when given) is
+// looked at before each report folder: no folder is listed after it.
+void RunCollectionCycle(const std::u16string& install_folder, const AlertFileProcessor& process,
+                        const platform::StopSignal* stop = nullptr);
 
 enum class CycleResult {
   kDone,          // the cycle ran (or was stopped)

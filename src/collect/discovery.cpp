@@ -1,6 +1,5 @@
 #include "collect/discovery.h"
 
-#include "common/utf.h"
 #include "log/log.h"
 #include "platform/platform.h"
 
@@ -35,16 +34,6 @@ std::vector<platform::DirEntry> Search(const std::u16string& folder, const std::
   return entries;
 }
 
-void WalkReportFolder(const std::u16string& report_folder, const char16_t* status,
-                      const std::u16string& component, StringList& files,
-                      const AlertFileProcessor& process) {
-  files.clear();
-  GetDomainFolders(report_folder, files);
-  WriteLog(u"After calling GetDomainFolders Function: " + report_folder + u" path contains " +
-           DecimalText(static_cast<int64_t>(files.size())) + u" file(s).");
-  if (!files.empty()) process(files, status, component);
-}
-
 }  // namespace
 
 void GetComponentFolders(const std::u16string& folder, StringList& components) {
@@ -71,36 +60,6 @@ void GetDomainFolders(const std::u16string& report_folder, StringList& files) {
 std::u16string InstallFolderOf(const std::u16string& executable_path) {
   const size_t cut = executable_path.rfind(platform::kPathSeparator);
   return cut == std::u16string::npos ? std::u16string() : executable_path.substr(0, cut);
-}
-
-void RunCollectionCycle(const std::u16string& install_folder, const AlertFileProcessor& process,
-                        const platform::StopSignal* stop) {
-  const auto stopped = [stop] { return stop != nullptr && stop->Requested(); };
-  platform::Env& env = platform::Current();
-  StringList components;
-  GetComponentFolders(install_folder, components);
-  for (const char16_t* name : kFixedComponentFolders) {
-    if (!env.PathExists(install_folder + platform::kPathSeparator + name)) continue;
-    components.push_back(name);
-    if (std::u16string(name) == u"Anomaly Alerts") {
-      WriteLog(u"Anomaly Alerts");
-      WriteLog(install_folder);
-    }
-  }
-  WriteLog(u"After calling GetDomainFolders Function: " + install_folder + u" path contains " +
-           DecimalText(static_cast<int64_t>(components.size())) + u" Component(s).");
-
-  StringList files;
-  for (const std::u16string& name : components) {
-    const std::u16string component = install_folder + platform::kPathSeparator + name;
-    if (!env.PathExists(component + NativeSeparators(u"\\AlertReports"))) continue;
-    const std::u16string sent = component + NativeSeparators(u"\\AlertReports\\Sent items");
-    if (stopped()) return;
-    if (env.PathExists(sent)) WalkReportFolder(sent, u"Delivered", name, files, process);
-    const std::u16string outbox = component + NativeSeparators(u"\\AlertReports\\Outbox");
-    if (stopped()) return;
-    if (env.PathExists(outbox)) WalkReportFolder(outbox, u"Failed", name, files, process);
-  }
 }
 
 }  // namespace asum

@@ -1,6 +1,6 @@
 // Alert folder discovery: which subfolders of the install folder are component
-// folders, which files of their report folders are unprocessed alerts, and the
-// collection cycle that hands each report folder's files to a processor.
+// folders and which files of their report folders are unprocessed alerts. The
+// cycle that walks them is in cycle.h.
 //
 // Runs on the processing thread (or a tool's thread). Reads names only, never
 // file contents; a missing folder anywhere is skipped without a log line.
@@ -8,13 +8,8 @@
 #pragma once
 
 #include <array>
-#include <functional>
 #include <string>
 #include <vector>
-
-namespace asum::platform {
-class StopSignal;
-}
 
 namespace asum {
 
@@ -44,15 +39,5 @@ void GetDomainFolders(const std::u16string& report_folder, StringList& files);
 // The folder of an executable path: the text before its last separator (empty
 // when there is none).
 std::u16string InstallFolderOf(const std::u16string& executable_path);
-
-// Receives one non-empty list of alert files, its status text ("Delivered" or
-// "Failed") and the component folder's name.
-using AlertFileProcessor =
-    std::function<void(StringList& files, const std::u16string& status, const std::u16string& component)>;
-
-// One collection cycle over `install_folder`. A stop request (when given) is
-// looked at before each report folder: no folder is listed after it.
-void RunCollectionCycle(const std::u16string& install_folder, const AlertFileProcessor& process,
-                        const platform::StopSignal* stop = nullptr);
 
 }  // namespace asum

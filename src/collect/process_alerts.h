@@ -1,5 +1,7 @@
 // Alert file processing: each listed alert message becomes one stored alert
-// row, and the file gets its "PROC_" name so later cycles skip it.
+// row, and the file gets its "PROC_" name so later cycles skip it. What a
+// file says is the alert rules' (alert_analysis.h), read ahead by the
+// look-ahead reader (analysis_pipeline.h); here the store-and-rename loop.
 //
 // Runs on one thread at a time per install folder (the processing thread, or
 // the command-line tool). Never throws. A file ends in one of three states:
@@ -10,47 +12,12 @@
 #include <cstdint>
 #include <string>
 
+#include "collect/alert_analysis.h"
 #include "collect/discovery.h"
 #include "platform/platform.h"
 #include "store/busy_budget.h"
 
 namespace asum {
-
-// One alert row, in the table's column order.
-struct AlertRow {
-  std::u16string alert_action;
-  std::u16string alert_type;
-  std::u16string alert_name;
-  std::u16string when;
-  std::u16string threshold;
-  std::u16string who;
-  std::u16string operation;
-  std::u16string component_name;
-  std::u16string email_status;
-  std::u16string server_name;
-  std::u16string alert_path;
-};
-
-enum class AlertOutcome {
-  kStore,        // a row is to be stored, then the file renamed
-  kMarkWithout,  // the file is renamed without a row
-  kLeave,        // the file cannot be loaded and keeps its name
-};
-
-// What one alert file says, worked out without touching the file or the store.
-struct AlertAnalysis {
-  bool loaded = false;
-  std::u16string sender, subject, body;
-  platform::SystemTime local_date;
-  AlertOutcome outcome = AlertOutcome::kLeave;
-  AlertRow row;  // meaningful when outcome is kStore
-};
-
-// Reads one alert file and derives its row as the processing does, writing
-// the same log lines. `status` is "Delivered" or "Failed"; `component` the
-// component folder's name.
-AlertAnalysis AnalyzeAlertFile(const std::u16string& path, const std::u16string& status,
-                               const std::u16string& component);
 
 // Counts of one processing call, for the tool.
 struct ProcessTally {

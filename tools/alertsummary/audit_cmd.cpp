@@ -11,7 +11,7 @@
 #include <unordered_map>
 #include <unordered_set>
 
-#include "collect/process_alerts.h"
+#include "collect/alert_analysis.h"
 #include "commands.h"
 #include "install_view.h"
 #include "platform/platform.h"

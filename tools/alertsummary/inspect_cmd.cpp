@@ -3,7 +3,7 @@
 #include <memory>
 #include <nlohmann/json.hpp>
 
-#include "collect/process_alerts.h"
+#include "collect/alert_analysis.h"
 #include "commands.h"
 
 namespace asum::tool {
