@@ -37,6 +37,7 @@
 #include "collect/process_alerts.h"
 #include "platform/platform.h"
 #include "store/alert_table.h"
+#include "store/setting_db_management.h"
 
 namespace fs = std::filesystem;
 using Clock = std::chrono::steady_clock;
@@ -243,8 +244,7 @@ RunFigures RunCycle(const std::u16string& install, const RowsByPath& rows, BareI
   asum::platform::ScopedEnv scoped(&env);
   const double bare_before = bare != nullptr ? bare->seconds() : 0;
   const auto start = Clock::now();
-  asum::CycleContext cycle;
-  const asum::CycleResult result = asum::RunProcessingCycle(install, cycle, &f.tally);
+  const asum::CycleResult result = asum::RunProcessingCycle(install, &f.tally);
   f.cycle_seconds = SecondsSince(start) - (bare != nullptr ? bare->seconds() - bare_before : 0);
   if (result != asum::CycleResult::kDone) std::printf("the cycle did not run (%d)\n", static_cast<int>(result));
   return f;

@@ -120,7 +120,7 @@ double IngestRate(const std::u16string& db_path, int rows, int first) {
 std::u16string NewStore(const fs::path& install) {
   fs::create_directories(install);
   const std::u16string db_path =
-      asum::CSettingDBManagement::DatabasePath(asum::CSettingDBManagement::GetAlertSummaryFolder(install.u16string()));
+      asum::DatabasePathOf(install.u16string());
   asum::CSettingDBManagement store;
   store.OpenDB(db_path);
   return db_path;
@@ -191,7 +191,7 @@ int main(int argc, char** argv) {
     const std::u16string install = (root / std::to_string(rows)).u16string();
     fs::create_directories(fs::path(install));
     const std::u16string db_path =
-        asum::CSettingDBManagement::DatabasePath(asum::CSettingDBManagement::GetAlertSummaryFolder(install));
+        asum::DatabasePathOf(install);
     {
       asum::CSettingDBManagement store;
       store.OpenDB(db_path);

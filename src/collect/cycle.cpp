@@ -24,18 +24,6 @@ void WalkReportFolder(const std::u16string& report_folder, const char16_t* statu
 }  // namespace
 
 
-std::u16string DatabasePathOf(const std::u16string& install_folder) {
-  return CSettingDBManagement::DatabasePath(CSettingDBManagement::GetAlertSummaryFolder(install_folder));
-}
-
-std::u16string CollectorLockPathOf(const std::u16string& install_folder) {
-  return CollectorLockPathIn(CSettingDBManagement::GetAlertSummaryFolder(install_folder));
-}
-
-std::u16string CollectorLockPathIn(const std::u16string& summary_folder) {
-  return summary_folder + platform::NativeSeparators(u"\\AlertSummaryDB.collector.lock");
-}
-
 void RunCollectionCycle(const std::u16string& install_folder, const AlertFileProcessor& process,
                         const platform::StopSignal* stop) {
   const auto stopped = [stop] { return stop != nullptr && stop->Requested(); };
@@ -101,13 +89,17 @@ CycleResult RunLockedCycle(const std::u16string& install_folder, const AlertFile
   return result;
 }
 
-CycleResult RunProcessingCycle(const std::u16string& install_folder, CycleContext& cycle, ProcessTally* tally) {
+CycleResult RunProcessingCycle(const std::u16string& install_folder, ProcessTally* tally, CycleContext* cycle,
+                               const std::function<void()>& after_folder) {
+  CycleContext own_context;
+  CycleContext& context = cycle != nullptr ? *cycle : own_context;
   return RunLockedCycle(
       install_folder,
       [&](StringList& files, const std::u16string& status, const std::u16string& component) {
-        ProcessAlertFiles(install_folder, files, status, component, &cycle, tally);
+        ProcessAlertFiles(install_folder, files, status, component, &context, tally);
+        if (after_folder) after_folder();
       },
-      cycle.stop);
+      context.stop);
 }
 
 }  // namespace asum

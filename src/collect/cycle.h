@@ -31,13 +31,6 @@ enum class CycleResult {
   kNotADatabase,  // the database file is not a database; no file was touched
 };
 
-// The database file of an install folder.
-std::u16string DatabasePathOf(const std::u16string& install_folder);
-// The collector lock file, beside the database.
-std::u16string CollectorLockPathOf(const std::u16string& install_folder);
-// The lock file in a database folder, for readers that must not create the folder.
-std::u16string CollectorLockPathIn(const std::u16string& summary_folder);
-
 // Takes the collector lock without waiting, checks that the database (when it
 // exists) is one, and runs one collection cycle over `install_folder`. A stop
 // request (when given) is looked at before the database is probed and before
@@ -45,11 +38,13 @@ std::u16string CollectorLockPathIn(const std::u16string& summary_folder);
 CycleResult RunLockedCycle(const std::u16string& install_folder, const AlertFileProcessor& process,
                            const platform::StopSignal* stop = nullptr);
 
-// The cycle of the library's thread: RunLockedCycle with every report folder
-// processed into the install folder's database, all of them sharing `cycle`
-// (its stop request and its one lock-wait allowance). Adds the counts to
-// `tally` when given.
-CycleResult RunProcessingCycle(const std::u16string& install_folder, CycleContext& cycle,
-                               ProcessTally* tally = nullptr);
+// One cycle as the library's thread and the tool run it: RunLockedCycle with
+// every report folder processed into the install folder's database, all of
+// them sharing `cycle` when given (its stop request and its one lock-wait
+// allowance; otherwise a context of the cycle's own). Adds the counts to
+// `tally` when given; `after_folder` (when set) is called after each report
+// folder's files are processed.
+CycleResult RunProcessingCycle(const std::u16string& install_folder, ProcessTally* tally = nullptr,
+                               CycleContext* cycle = nullptr, const std::function<void()>& after_folder = {});
 
 }  // namespace asum

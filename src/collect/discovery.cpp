@@ -57,9 +57,4 @@ void GetDomainFolders(const std::u16string& report_folder, StringList& files) {
   platform::Current().ListFiles(report_folder, wildcard, "PROC_", &files);
 }
 
-std::u16string InstallFolderOf(const std::u16string& executable_path) {
-  const size_t cut = executable_path.rfind(platform::kPathSeparator);
-  return cut == std::u16string::npos ? std::u16string() : executable_path.substr(0, cut);
-}
-
 }  // namespace asum

@@ -36,8 +36,4 @@ void GetComponentFolders(const std::u16string& folder, StringList& components);
 // and whose path does not contain "PROC_".
 void GetDomainFolders(const std::u16string& report_folder, StringList& files);
 
-// The folder of an executable path: the text before its last separator (empty
-// when there is none).
-std::u16string InstallFolderOf(const std::u16string& executable_path);
-
 }  // namespace asum

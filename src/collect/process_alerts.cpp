@@ -1,7 +1,6 @@
 #include "collect/process_alerts.h"
 
 #include "collect/analysis_pipeline.h"
-#include "common/utf.h"
 #include "log/log.h"
 #include "store/setting_db_management.h"
 
@@ -37,7 +36,7 @@ bool KeepRowOfUnmarkedFile(CSettingDBManagement& store, int64_t row_id, const st
     WriteLog(path + u" is gone; the row stored for it stays");
     return true;
   }
-  if (row_id > 0 && store.ExecuteQuery(u"DELETE FROM AlertDB WHERE rowid = ?1", {DecimalText(row_id)})) {
+  if (row_id > 0 && store.RemoveAlert(row_id)) {
     WriteLog(u"Removed the row stored for " + path + u"; it is stored again when the file is processed");
   } else {
     WriteLog(u"Could not remove the row stored for " + path);
@@ -48,15 +47,11 @@ bool KeepRowOfUnmarkedFile(CSettingDBManagement& store, int64_t row_id, const st
 }  // namespace
 
 std::u16string ProcName(const std::u16string& path) {
-  const size_t cut = path.rfind(platform::kPathSeparator);
-  const std::u16string folder = cut == std::u16string::npos ? std::u16string() : path.substr(0, cut);
-  const std::u16string name = cut == std::u16string::npos ? path : path.substr(cut + 1);
-  return folder + platform::kPathSeparator + u"PROC_" + name;
+  return platform::FolderOf(path) + platform::kPathSeparator + u"PROC_" + platform::NameOf(path);
 }
 
 bool EnsureDatabase(const std::u16string& install_folder) {
-  const std::u16string db_path =
-      CSettingDBManagement::DatabasePath(CSettingDBManagement::GetAlertSummaryFolder(install_folder));
+  const std::u16string db_path = DatabasePathOf(install_folder);
   if (platform::Current().PathExists(db_path)) return true;
   CSettingDBManagement store;
   if (store.OpenDB(db_path)) store.CloseDB();
@@ -80,8 +75,7 @@ void ProcessAlertFiles(const std::u16string& install_folder, StringList& files, 
     counts.left += files.size();
     return;
   }
-  const std::u16string db_path =
-      CSettingDBManagement::DatabasePath(CSettingDBManagement::GetAlertSummaryFolder(install_folder));
+  const std::u16string db_path = DatabasePathOf(install_folder);
   CSettingDBManagement store(&context.busy);
   if (!store.OpenDB(db_path)) {
     store.CloseDB();
@@ -111,11 +105,8 @@ void ProcessAlertFiles(const std::u16string& install_folder, StringList& files, 
         }
         continue;
       }
-      const AlertRow& row = analysis.row;
       WriteLog(u"Before calling \"FillDataDB\" function ");
-      const bool inserted = store.FillDatainDB(row.alert_action, row.alert_type, row.alert_name, row.when, row.threshold,
-                                               row.who, row.operation, row.component_name, row.email_status,
-                                               row.alert_path, row.server_name);
+      const bool inserted = store.FillDatainDB(analysis.row);
       WriteLog(u"After calling \"FillDataDB\" function ");
       if (!inserted) {
         WriteLog(u"Data is not inserted in DB");

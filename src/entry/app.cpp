@@ -3,8 +3,8 @@
 #include <mutex>
 
 #include "collect/cycle.h"
-#include "collect/process_alerts.h"
 #include "log/log.h"
+#include "store/setting_db_management.h"
 
 namespace asum {
 
@@ -52,16 +52,9 @@ bool BEProcessSuccessfulAlerts::StopProcessing(uint32_t ms) {
   return m_hThread->WaitUntilFinished(ms);
 }
 
-void BEProcessSuccessfulAlerts::ProcessAlertFiles(StringList* strListofFilePaths, std::u16string strEmailStatus,
-                                                  std::u16string strComponentFolder) {
-  if (strListofFilePaths == nullptr) return;
-  asum::ProcessAlertFiles(InstallFolderOf(platform::Current().ExecutablePath()), *strListofFilePaths, strEmailStatus,
-                          strComponentFolder);
-}
-
 void RunLibraryCycle(const platform::StopSignal& stop) {
   CycleContext cycle(&stop);
-  RunProcessingCycle(InstallFolderOf(platform::Current().ExecutablePath()), cycle);
+  RunProcessingCycle(HostInstallFolder(), nullptr, &cycle);
 }
 
 }  // namespace asum

@@ -7,7 +7,6 @@
 // would store every alert twice.
 #pragma once
 
-#include "collect/discovery.h"
 #include "entry/processing_thread.h"
 
 namespace asum {
@@ -24,11 +23,6 @@ class BEProcessSuccessfulAlerts {
   // Asks a running thread to stop and waits up to `ms` for its current cycle
   // to end. True when no thread runs any more.
   bool StopProcessing(uint32_t ms);
-
-  // Processes one report folder's alert files into the database beside the
-  // host executable.
-  void ProcessAlertFiles(StringList* strListofFilePaths, std::u16string strEmailStatus,
-                         std::u16string strComponentFolder);
 
  private:
   ProcessingThread* m_hThread = nullptr;  // the thread reference; never freed

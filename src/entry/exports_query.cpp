@@ -3,6 +3,7 @@
 // objects, which this export reads and destroys as their framework would.
 #include "entry/alertsummary.h"
 #include "entry/framework_string.h"
+#include "entry/host_text.h"
 #include "store/host_queries.h"
 
 #ifdef _WIN32

@@ -65,6 +65,16 @@ std::u16string NativeSeparators(std::u16string path) {
   return path;
 }
 
+std::u16string FolderOf(const std::u16string& path) {
+  const size_t cut = path.rfind(kPathSeparator);
+  return cut == std::u16string::npos ? std::u16string() : path.substr(0, cut);
+}
+
+std::u16string NameOf(const std::u16string& path) {
+  const size_t cut = path.rfind(kPathSeparator);
+  return cut == std::u16string::npos ? path : path.substr(cut + 1);
+}
+
 std::u16string FileResult::Describe() const {
   std::string text = StatusWords(status);
   if (os_error != 0) text += " (" + std::to_string(os_error) + ")";

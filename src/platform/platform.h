@@ -40,6 +40,12 @@ inline constexpr char16_t kPathSeparator = u'/';
 // never for texts that came from outside.
 std::u16string NativeSeparators(std::u16string path);
 
+// The text of a path before its last separator (empty when there is none:
+// an executable's path gives its install folder), and the text after it (the
+// whole path when there is none).
+std::u16string FolderOf(const std::u16string& path);
+std::u16string NameOf(const std::u16string& path);
+
 // A calendar time in the layout of the Windows SYSTEMTIME record.
 struct SystemTime {
   uint16_t year = 0;

@@ -70,7 +70,7 @@ int CountAlerts(const std::u16string& install_folder, const std::u16string& filt
   BusyBudget budget(busy_timeout_ms);
   CSettingDBManagement store(&budget);
   const std::u16string path =
-      CSettingDBManagement::DatabasePath(CSettingDBManagement::GetAlertSummaryFolder(install_folder));
+      DatabasePathOf(install_folder);
   if (!store.OpenDB(path)) return 0;  // the connection object releases what the open left
   const CountStatement statement = BuildCountStatement(filter, range);
   const int32_t count = WcstolBase10(store.ExecuteScalar(statement.sql, statement.params));

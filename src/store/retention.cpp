@@ -60,7 +60,7 @@ int DeleteOldAlerts(const std::u16string& install_folder, const std::u16string& 
   BusyBudget budget(busy_timeout_ms);
   CSettingDBManagement store(&budget);
   const std::u16string path =
-      CSettingDBManagement::DatabasePath(CSettingDBManagement::GetAlertSummaryFolder(install_folder));
+      DatabasePathOf(install_folder);
   if (!store.OpenDB(path)) return 0;
   const bool deleted = store.ExecuteQuery(u"DELETE FROM AlertDB WHERE \"When\" <= '" + cutoff + u"';");
   // Closed here: a connection left open would hold the file for the next caller.

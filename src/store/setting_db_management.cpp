@@ -1,5 +1,6 @@
 #include "store/setting_db_management.h"
 
+#include "common/utf.h"
 #include "log/log.h"
 #include "platform/platform.h"
 #include "store/alert_table.h"
@@ -18,10 +19,18 @@ std::unique_ptr<CSqlStatement> Prepare(CDbSQLite& db, const std::u16string& sql,
 
 }  // namespace
 
-std::u16string HostInstallFolder() {
-  const std::u16string exe = platform::Current().ExecutablePath();
-  const size_t last = exe.rfind(platform::kPathSeparator);
-  return last == std::u16string::npos ? std::u16string() : exe.substr(0, last);
+std::u16string HostInstallFolder() { return platform::FolderOf(platform::Current().ExecutablePath()); }
+
+std::u16string DatabasePathOf(const std::u16string& install_folder) {
+  return CSettingDBManagement::DatabasePath(CSettingDBManagement::GetAlertSummaryFolder(install_folder));
+}
+
+std::u16string CollectorLockPathOf(const std::u16string& install_folder) {
+  return CollectorLockPathIn(CSettingDBManagement::GetAlertSummaryFolder(install_folder));
+}
+
+std::u16string CollectorLockPathIn(const std::u16string& summary_folder) {
+  return summary_folder + platform::NativeSeparators(u"\\AlertSummaryDB.collector.lock");
 }
 
 std::u16string ExecuteQueryStatusLine(bool succeeded) {
@@ -42,7 +51,6 @@ std::u16string CSettingDBManagement::GetAlertSummaryFolder(const std::u16string&
   if (!env.PathExists(folder)) env.CreateFolder(folder);
   return folder;
 }
-
 
 std::u16string CSettingDBManagement::DatabasePath(const std::u16string& summary_folder) {
   return summary_folder + platform::NativeSeparators(u"\\AlertSummaryDB.db");
@@ -124,12 +132,21 @@ bool CSettingDBManagement::FillDatainDB(const std::u16string& alert_action, cons
                                         const std::u16string& operation, const std::u16string& component_name,
                                         const std::u16string& email_status, const std::u16string& alert_path,
                                         const std::u16string& server_name) {
+  return FillDatainDB(AlertRow{alert_action, alert_type, alert_name, when, threshold, who, operation, component_name,
+                               email_status, server_name, alert_path});
+}
+
+bool CSettingDBManagement::FillDatainDB(const AlertRow& row) {
   WriteLog(u"Inside FillDatainDB function");
   // Bound rather than spliced: a quote in a subject must not break the
   // statement and keep the alert out of the table in every cycle.
   return ExecuteQuery(u"INSERT into AlertDB VALUES(?,?,?,?,?,?,?,?,?, ?, ?)",
-                      {alert_action, alert_type, alert_name, when, threshold, who, operation, component_name,
-                       email_status, server_name, alert_path});
+                      {row.alert_action, row.alert_type, row.alert_name, row.when, row.threshold, row.who,
+                       row.operation, row.component_name, row.email_status, row.server_name, row.alert_path});
+}
+
+bool CSettingDBManagement::RemoveAlert(int64_t row_id) {
+  return ExecuteQuery(u"DELETE FROM AlertDB WHERE rowid = ?1", {DecimalText(row_id)});
 }
 
 }  // namespace asum

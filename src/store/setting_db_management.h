@@ -1,6 +1,7 @@
-// The alert summary database facade: where the file lives, opening it (and
-// creating its table when the file is new), running statements with the
-// store's retry and log rules, and inserting one alert row.
+// The alert summary database facade: where the file and the collector lock
+// of an install folder live, opening the file (and creating its table when
+// the file is new), running statements with the store's retry and log rules,
+// and inserting and removing one alert row.
 //
 // One object is one connection for one operation on one thread: a processing
 // call, a count or a purge each make their own, open it, use it and close it
@@ -14,6 +15,7 @@
 #include <string>
 #include <vector>
 
+#include "store/alert_table.h"
 #include "store/busy_budget.h"
 #include "store/sqlite_db.h"
 
@@ -22,6 +24,14 @@ namespace asum {
 // The host executable's folder: its path up to the last separator (empty when
 // there is none).
 std::u16string HostInstallFolder();
+
+// The database file of an install folder; its folder is created when missing.
+std::u16string DatabasePathOf(const std::u16string& install_folder);
+// The collector lock file, beside the database; its folder is created when
+// missing.
+std::u16string CollectorLockPathOf(const std::u16string& install_folder);
+// The lock file in a database folder, for readers that must not create the folder.
+std::u16string CollectorLockPathIn(const std::u16string& summary_folder);
 
 class CSettingDBManagement {
  public:
@@ -69,6 +79,10 @@ class CSettingDBManagement {
                     const std::u16string& operation, const std::u16string& component_name,
                     const std::u16string& email_status, const std::u16string& alert_path,
                     const std::u16string& server_name);
+  // The same for a row; this is the insert the eleven values above make.
+  bool FillDatainDB(const AlertRow& row);
+  // Removes the row of that rowid (through ExecuteQuery, with its log line).
+  bool RemoveAlert(int64_t row_id);
 
   CDbSQLite& Connection() { return db_; }
 

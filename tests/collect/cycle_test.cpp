@@ -5,6 +5,7 @@
 #include <algorithm>
 
 #include "collect/process_alerts.h"
+#include "store/setting_db_management.h"
 #include "support/test_support.h"
 
 namespace asum {
@@ -24,11 +25,7 @@ class LockedCycleTest : public ::testing::Test {
     WriteText(dir_.Join(u"Comp\\AlertReports\\Sent items\\a.eml"), kAlert);
   }
   CycleResult Run() {
-    return RunLockedCycle(dir_.path(), [&](StringList& files, const std::u16string& status,
-                                           const std::u16string& component) {
-      ++calls_;
-      ProcessAlertFiles(dir_.path(), files, status, component);
-    });
+    return RunProcessingCycle(dir_.path(), nullptr, nullptr, [&] { ++calls_; });
   }
   std::vector<std::u16string> Names() { return test::ListNames(dir_.Join(u"Comp\\AlertReports\\Sent items")); }
 
@@ -136,7 +133,7 @@ TEST_F(LockedCycleTest, AStopIsSeenBeforeEachReportFolderTheDatabaseAndEachFile)
     CycleContext cycle(&stop);
     {
       platform::ScopedEnv scope(&env);
-      EXPECT_EQ(RunProcessingCycle(dir.path(), cycle), CycleResult::kDone);
+      EXPECT_EQ(RunProcessingCycle(dir.path(), nullptr, &cycle), CycleResult::kDone);
     }
     int stored = 0;
     for (const char16_t* folder : {u"Sent items", u"Outbox"}) {

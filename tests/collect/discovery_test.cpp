@@ -10,6 +10,7 @@
 #include "collect/cycle.h"
 #include "collect/process_alerts.h"
 
+#include "store/setting_db_management.h"
 #include "support/test_support.h"
 
 namespace asum {
@@ -159,11 +160,7 @@ TEST(RunCollectionCycle, ANameThatIsNotUtf8IsStoredAndMarkedByItsExactBytes) {
       << "From: alerts@corp.example\r\nSubject: Threshold Alert: File Change \"Mass deletion\" (FS01(File Server)"
          "\\File Server Changes\\Daily)\r\nContent-Type: text/html\r\n\r\n<p>body</p>";
   EnsureDatabase(dir.path());
-  const auto cycle = RunLockedCycle(dir.path(), [&](StringList& files, const std::u16string& status,
-                                                    const std::u16string& component) {
-    ProcessAlertFiles(dir.path(), files, status, component);
-  });
-  ASSERT_EQ(cycle, CycleResult::kDone);
+  ASSERT_EQ(RunProcessingCycle(dir.path()), CycleResult::kDone);
   EXPECT_FALSE(std::filesystem::exists(folder / "Alert_caf\xe9.eml"));
   EXPECT_TRUE(std::filesystem::exists(folder / "PROC_Alert_caf\xe9.eml"));
 
@@ -183,12 +180,6 @@ TEST(RunCollectionCycle, ANameThatIsNotUtf8IsStoredAndMarkedByItsExactBytes) {
   EXPECT_NE(std::find(messages.begin(), messages.end(), logged), messages.end());
 }
 #endif
-
-TEST(InstallFolderOf, CutsAtTheLastSeparator) {
-  const std::u16string sep(1, platform::kPathSeparator);
-  EXPECT_EQ(InstallFolderOf(sep + u"opt" + sep + u"host.exe"), sep + u"opt");
-  EXPECT_EQ(InstallFolderOf(u"host.exe"), u"");
-}
 
 }  // namespace
 }  // namespace asum

@@ -9,6 +9,7 @@
 
 #include "collect/cycle.h"
 #include "mail/cls_email.h"
+#include "store/setting_db_management.h"
 #include "support/test_support.h"
 
 namespace asum {
@@ -291,10 +292,13 @@ TEST_F(ProcessAlertFilesTest, AFailedRenameRemovesTheRowOnlyWhileTheFileIsThere)
   }
 }
 
-TEST(ProcName, PrefixesTheFileName) {
+// The same cut gives the host's install folder from its executable's path.
+TEST(ProcName, PrefixesTheFileNameAfterTheLastSeparator) {
   const std::u16string sep(1, platform::kPathSeparator);
   EXPECT_EQ(ProcName(sep + u"r" + sep + u"a.eml"), sep + u"r" + sep + u"PROC_a.eml");
   EXPECT_EQ(ProcName(u"a.eml"), sep + u"PROC_a.eml");
+  EXPECT_EQ(platform::FolderOf(sep + u"opt" + sep + u"host.exe"), sep + u"opt");
+  EXPECT_EQ(platform::FolderOf(u"host.exe"), u"");
 }
 
 }  // namespace

@@ -35,7 +35,7 @@ TEST(Crash, KilledMidBacklogLosesNothingAndStoresAtMostOneFileTwice) {
   const pid_t child = fork();
   ASSERT_GE(child, 0);
   if (child == 0) {
-    for (int cycle = 0; cycle < 10; ++cycle) install.Cycle();
+    for (int cycle = 0; cycle < 10; ++cycle) RunProcessingCycle(install.path());
     _exit(0);
   }
   const auto give_up = std::chrono::steady_clock::now() + std::chrono::seconds(30);
@@ -52,7 +52,7 @@ TEST(Crash, KilledMidBacklogLosesNothingAndStoresAtMostOneFileTwice) {
   EXPECT_EQ(install.IntegrityCheck(), "ok");
 
   // Restart: the killed process's collector lock went with it.
-  ASSERT_EQ(install.Cycle(), CycleResult::kDone);
+  ASSERT_EQ(RunProcessingCycle(install.path()), CycleResult::kDone);
   const auto rows = install.RowsByPath();
   int twice = 0;
   for (const std::u16string& p : paths) {

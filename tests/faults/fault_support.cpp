@@ -40,11 +40,6 @@ std::u16string Install::DropAtomically(const std::u16string& name, const std::st
   return target;
 }
 
-CycleResult Install::Cycle(ProcessTally* tally, CycleContext* cycle) const {
-  CycleContext own;
-  return RunProcessingCycle(path(), cycle != nullptr ? *cycle : own, tally);
-}
-
 namespace {
 
 template <typename Fn>

@@ -1,6 +1,6 @@
 // An install folder for the fault tests: one component with its marker file,
-// alert files dropped into its report folders, cycles run the way the
-// library's thread runs them, and the stored rows read back directly.
+// alert files dropped into its report folders (cycles run through
+// RunProcessingCycle, as the library's thread runs them), and the stored rows read back directly.
 //
 // Single-threaded use unless a method says otherwise.
 #pragma once
@@ -13,6 +13,7 @@
 
 #include "collect/cycle.h"
 #include "collect/process_alerts.h"
+#include "store/setting_db_management.h"
 #include "support/test_support.h"
 
 namespace asum::test {
@@ -33,10 +34,6 @@ class Install {
   // Writes it under another name outside the report folders, then renames it
   // in, so a collector never sees half a file. Safe beside a running cycle.
   std::u16string DropAtomically(const std::u16string& name, const std::string& bytes) const;
-
-  // One cycle through the collector lock, as the library's thread runs it,
-  // in `cycle` when given. Adds to `tally` when given.
-  CycleResult Cycle(ProcessTally* tally = nullptr, CycleContext* cycle = nullptr) const;
 
   // "Alert Path" of every stored row, with its number of rows.
   std::map<std::u16string, int> RowsByPath() const;

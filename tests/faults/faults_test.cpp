@@ -75,7 +75,7 @@ TEST(StoreFaults, DatabaseLockedLongerThanACycleCostsOneAllowanceAndLeavesTheFil
   ASSERT_EQ(sqlite3_exec(holder, "BEGIN EXCLUSIVE", nullptr, nullptr, nullptr), SQLITE_OK);
   CycleContext cycle(nullptr, 100);
   ProcessTally tally;
-  EXPECT_EQ(install.Cycle(&tally, &cycle), CycleResult::kDone);
+  EXPECT_EQ(RunProcessingCycle(install.path(), &tally, &cycle), CycleResult::kDone);
   EXPECT_EQ(tally.left, paths.size());
   EXPECT_TRUE(cycle.busy.Exhausted());
   EXPECT_LE(cycle.busy.SpentMs(), cycle.busy.TotalMs());
@@ -83,7 +83,7 @@ TEST(StoreFaults, DatabaseLockedLongerThanACycleCostsOneAllowanceAndLeavesTheFil
   sqlite3_close(holder);
   ExpectAllLeft(install, paths);
 
-  EXPECT_EQ(install.Cycle(), CycleResult::kDone);
+  EXPECT_EQ(RunProcessingCycle(install.path()), CycleResult::kDone);
   ExpectAllStoredOnce(install, paths);
 }
 
@@ -91,24 +91,24 @@ TEST(StoreFaults, DatabaseReplacedByAnotherFileIsNeverTouchedAndDeletedIsRebuilt
   CapturedLog log;
   Install install;
   const auto first = DropAlerts(install, 3);
-  ASSERT_EQ(install.Cycle(), CycleResult::kDone);
+  ASSERT_EQ(RunProcessingCycle(install.path()), CycleResult::kDone);
   ExpectAllStoredOnce(install, first);
 
   const std::string junk = "this is a spreadsheet, not a database\r\n" + std::string(5000, 'x');
   WriteText(install.DbPath(), junk);
   const std::u16string late = install.Drop(u"late.eml", PlainAlert("CORP\\late"));
-  EXPECT_EQ(install.Cycle(), CycleResult::kNotADatabase);
-  EXPECT_EQ(install.Cycle(), CycleResult::kNotADatabase);
+  EXPECT_EQ(RunProcessingCycle(install.path()), CycleResult::kNotADatabase);
+  EXPECT_EQ(RunProcessingCycle(install.path()), CycleResult::kNotADatabase);
   EXPECT_EQ(ReadText(install.DbPath()), junk);
   EXPECT_TRUE(Exists(late));
 
   // Someone removes the file: the first cycle creates a new database and
   // leaves the files, the next stores them.
   RemoveTree(install.DbPath());
-  EXPECT_EQ(install.Cycle(), CycleResult::kDone);
+  EXPECT_EQ(RunProcessingCycle(install.path()), CycleResult::kDone);
   EXPECT_TRUE(Exists(install.DbPath()));
   EXPECT_TRUE(Exists(late));
-  EXPECT_EQ(install.Cycle(), CycleResult::kDone);
+  EXPECT_EQ(RunProcessingCycle(install.path()), CycleResult::kDone);
   ExpectAllStoredOnce(install, {late});
   EXPECT_EQ(install.RowCount(), 1);
 }
@@ -134,7 +134,7 @@ TEST(ReportFolderFaults, RenamesRefusedLeaveEveryFileWithoutARowUntilTheyWork) {
     platform::ScopedEnv scoped(&refusing);
     for (int cycle = 0; cycle < 2; ++cycle) {
       ProcessTally tally;
-      EXPECT_EQ(install.Cycle(&tally), CycleResult::kDone);
+      EXPECT_EQ(RunProcessingCycle(install.path(), &tally), CycleResult::kDone);
       EXPECT_EQ(tally.left, 5u);
       EXPECT_EQ(tally.stored, 0u);
     }
@@ -144,7 +144,7 @@ TEST(ReportFolderFaults, RenamesRefusedLeaveEveryFileWithoutARowUntilTheyWork) {
   EXPECT_EQ(install.RowCount(), 0) << "a row whose file kept its name would be stored again every cycle";
 
   ProcessTally tally;
-  EXPECT_EQ(install.Cycle(&tally), CycleResult::kDone);
+  EXPECT_EQ(RunProcessingCycle(install.path(), &tally), CycleResult::kDone);
   EXPECT_EQ(tally.stored, 4u);
   EXPECT_EQ(tally.marked, 1u);
   ExpectAllStoredOnce(install, paths);
@@ -195,7 +195,7 @@ void ExpectFullThenRecovered(const Install& install, const std::vector<std::u16s
   }
   EXPECT_EQ(install.IntegrityCheck(), "ok");
   make_room();
-  EXPECT_EQ(install.Cycle(), CycleResult::kDone);
+  EXPECT_EQ(RunProcessingCycle(install.path()), CycleResult::kDone);
   ExpectAllStoredOnce(install, paths);
 }
 
@@ -208,7 +208,7 @@ TEST(StoreFaults, FullDatabaseKeepsTheFilesItCouldNotStore) {
   g_page_limit = pages + 2;
   ASSERT_EQ(sqlite3_auto_extension(reinterpret_cast<void (*)(void)>(&LimitPages)), SQLITE_OK);
   ProcessTally tally;
-  EXPECT_EQ(install.Cycle(&tally), CycleResult::kDone);
+  EXPECT_EQ(RunProcessingCycle(install.path(), &tally), CycleResult::kDone);
   g_page_limit = 0;
   sqlite3_cancel_auto_extension(reinterpret_cast<void (*)(void)>(&LimitPages));
   ExpectFullThenRecovered(install, paths, tally, [] {});
@@ -260,7 +260,7 @@ TEST(StoreFaults, DiskFullWhileInsertingKeepsTheFilesItCouldNotStore) {
   const auto paths = DropAlerts(install, 40, std::string(600, 'w'));
   disk.Fill(12 * 1024);
   ProcessTally tally;
-  EXPECT_EQ(install.Cycle(&tally), CycleResult::kDone);
+  EXPECT_EQ(RunProcessingCycle(install.path(), &tally), CycleResult::kDone);
   ExpectFullThenRecovered(install, paths, tally, [&] { disk.Free(); });
 }
 #endif

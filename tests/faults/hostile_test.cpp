@@ -64,14 +64,14 @@ TEST(HostileFiles, EachReachesItsEndInACycleAndTheNextCycleChangesNothing) {
   const std::vector<std::u16string> paths = DropAll(install, files);
 
   ProcessTally tally;
-  ASSERT_EQ(install.Cycle(&tally), CycleResult::kDone);
+  ASSERT_EQ(RunProcessingCycle(install.path(), &tally), CycleResult::kDone);
   CheckEnds(install, files, paths);
   const int rows = install.RowCount();
 
   // The folder named like an alert is never listed, so nothing was left in
   // the cycle: every listed file was stored or marked.
   EXPECT_EQ(tally.left, 0u);
-  ASSERT_EQ(install.Cycle(&tally), CycleResult::kDone);
+  ASSERT_EQ(RunProcessingCycle(install.path(), &tally), CycleResult::kDone);
   EXPECT_EQ(install.RowCount(), rows);
 
   // Handed over by name anyway, the folder keeps its name and stops nothing.
@@ -94,7 +94,7 @@ struct StackRun {
 
 void* RunCycleOnSmallStack(void* arg) {
   auto* run = static_cast<StackRun*>(arg);
-  run->result = run->install->Cycle();
+  run->result = RunProcessingCycle(run->install->path());
   return nullptr;
 }
 

@@ -85,7 +85,7 @@ TEST(Stress, ArrivingFilesWithCountsAndPurgesEndStoredOnceOrUnderTheirNames) {
   ProcessingThread* processing = ProcessingThread::Start(5, [&](const platform::StopSignal& stop) {
     CycleContext cycle(&stop);
     ProcessTally tally;
-    install.Cycle(&tally, &cycle);
+    RunProcessingCycle(install.path(), &tally, &cycle);
     stored_known += tally.stored;
   });
   ASSERT_NE(processing, nullptr);

@@ -7,6 +7,7 @@
 #include "commands.h"
 #include "platform/platform.h"
 #include "progress.h"
+#include "store/setting_db_management.h"
 
 namespace asum::tool {
 namespace {
@@ -29,12 +30,8 @@ int RunOnce(const std::u16string& install, bool first_creates) {
   if (first_creates) EnsureDatabase(install);
   Progress progress(Backlog(install));
   ProcessTally tally;
-  CycleContext cycle;
-  const CycleResult result = RunLockedCycle(install, [&](StringList& files, const std::u16string& status,
-                                                           const std::u16string& component) {
-    ProcessAlertFiles(install, files, status, component, &cycle, &tally);
-    progress.Advance(tally.stored + tally.marked + tally.left);
-  });
+  const CycleResult result =
+      RunProcessingCycle(install, &tally, nullptr, [&] { progress.Advance(tally.stored + tally.marked + tally.left); });
   if (result == CycleResult::kBusy) {
     std::fprintf(stderr, "alertsummary: another collector (the service or another tool) is working on %s; "
                          "nothing was done\n", Utf8(install).c_str());
