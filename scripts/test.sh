@@ -4,7 +4,6 @@
 #   SKIP_SETUP=1 scripts/test.sh   without the package check
 set -euo pipefail
 cd "$(dirname "$0")/.."
-root=$(pwd)
 
 [[ "${SKIP_SETUP:-0}" == 1 ]] || scripts/setup.sh
 
