@@ -48,6 +48,8 @@ struct CycleContext {
 // it with its table and returns false.
 bool EnsureDatabase(const std::u16string& install_folder);
 
+// The processing call, the one RunProcessingCycle makes for each report
+// folder (its first log line names it as the host's application knew it).
 // Processes `files` (full paths, as the collection cycle lists them) into the
 // database of `install_folder`. `cycle` is the context of the cycle the call
 // belongs to (null: the call is a cycle of its own). Adds its counts to
