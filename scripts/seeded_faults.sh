@@ -37,6 +37,8 @@ trap 'restore; rm -rf "$work"' EXIT
 trap 'echo "interrupted: file restored" >&2; exit 130' INT TERM
 
 [ -f "$build/build.ninja" ] || { echo "configure $build first (cmake -G Ninja)" >&2; exit 2; }
+# Read from a copy, so the list can be edited while a run goes on.
+cp "$list" "$work/list"
 
 # Splits a list line into its five fields, one per line of output.
 split_line() {
@@ -107,7 +109,7 @@ while IFS= read -r line || [ -n "$line" ]; do
   fi
   restore
   rows+=("$(printf '%-8s %-14s %s%s' "$labels" "$result" "$name" "${by:+  <- $by}")")
-done < "$list"
+done < "$work/list"
 
 # Rebuild from the restored sources, so the build folder holds the real code again.
 if [ ${#built[@]} -gt 0 ]; then

@@ -47,7 +47,7 @@ TEST(DecodeEncodedWords, DecodesWellFormedWordsAndKeepsTheRest) {
       {"x =?utf-8?q?a?= =?utf-8?q?b?=\t=?utf-8?q?c?= y", "x abc y"},
       {"=?utf-8?q?a?= x =?utf-8?q?b?=", "a x b"},
       {"=?UTF-8?B?4oK=?= =?utf-8?B?rA==?=", "\xE2\x82\xAC"},  // a character split across two words
-      {"=?utf-8*en?Q?a?=", "a"},
+      {"=?koi8-r*ru?Q?=F0?=", "\xD0\x9F"},  // an RFC 2231 language suffix
       {"=?iso-8859-1?Q?Gr=FC=DFe?=", "Gr\xC3\xBC\xC3\x9F" "e"},
       {"=?koi8-r?B?8NLJ18XU?=", "\xD0\x9F\xD1\x80\xD0\xB8\xD0\xB2\xD0\xB5\xD1\x82"},
       {"=?windows-1251?Q?=CF=F0=E8?=", "\xD0\x9F\xD1\x80\xD0\xB8"},

@@ -50,6 +50,7 @@ TEST(LoadEml, HeaderEndsAtTheEarliestEmptyLineWhateverTheLineEnds) {
   } cases[] = {
       {kAlternative, subject, html},
       {"\xEF\xBB\xBF" + kAlternative, subject, html},
+      {"\xEF\xBB\xBFSubject: a\r\n\r\nb", "a", "b"},
       {Replaced(kAlternative, "\r\n", "\n"), subject, html},
       {Replaced(kAlternative, "\r\n", "\r"), subject, html},
       {"\r\nSubject: x\r\nFrom: a@b\r\n\r\nbody", "", "Subject: x\r\nFrom: a@b\r\n\r\nbody"},
