@@ -1,119 +1,104 @@
 #include "store/setting_db_management.h"
 
-#include <gtest/gtest.h>
-
-#include <algorithm>
-
 #include "store/alert_table.h"
 #include "store_test_support.h"
 
 namespace asum {
 namespace {
 
-using test::StoreDir;
+using Texts = std::vector<std::u16string>;
 
 TEST(AlertTable, CreateStatementIsExact) {
   const std::u16string tabs(8, u'\t');
-  const std::u16string expected =
-      u"CREATE TABLE AlertDB (" + tabs + u" \"Alert Action\"\tTEXT NOT NULL," + tabs +
-      u" \"Alert Type\"\tTEXT NOT NULL," + tabs + u" \"Alert Name\"\tTEXT NOT NULL," + tabs +
-      u" \"When\"\tTEXT NOT NULL," + tabs + u" \"Threshold\"\tTEXT NOT NULL," + tabs + u" \"Who\"\tTEXT NOT NULL," +
-      tabs + u" \"Operation\"\tTEXT NOT NULL," + tabs + u" \"Component Name\"\tTEXT NOT NULL," + tabs +
-      u" \"EmailStatus\"\tTEXT NOT NULL," + tabs + u" \"Server Name\"\tTEXT NOT NULL," + tabs +
-      u" \"Alert Path\"\tTEXT NOT NULL)";
-  EXPECT_EQ(CreateAlertTableSql().size(), 411u);
+  std::u16string expected = u"CREATE TABLE AlertDB (";
+  for (const char16_t* column : {u"Alert Action", u"Alert Type", u"Alert Name", u"When", u"Threshold", u"Who",
+                                 u"Operation", u"Component Name", u"EmailStatus", u"Server Name", u"Alert Path"}) {
+    expected += tabs + u" \"" + column + u"\"\tTEXT NOT NULL,";
+  }
+  expected.back() = u')';
   EXPECT_EQ(CreateAlertTableSql(), expected);
+  EXPECT_EQ(expected.size(), 411u);
 }
 
 TEST(AlertSummaryFolder, JoinsAndCreatesOneLevel) {
   test::TempDir dir;
-  const std::u16string sep(1, platform::kPathSeparator);
-  EXPECT_EQ(CSettingDBManagement::GetAlertSummaryFolder(dir.path()), dir.path() + sep + u"Alert_Summary");
-  EXPECT_TRUE(platform::Current().PathExists(dir.path() + sep + u"Alert_Summary"));
-  EXPECT_EQ(CSettingDBManagement::GetAlertSummaryFolder(dir.path() + sep), dir.path() + sep + u"Alert_Summary");
-  // One level only: a missing parent is not created, and that is no error.
+  const std::u16string summary = dir.Join(u"Alert_Summary");
+  EXPECT_EQ(CSettingDBManagement::GetAlertSummaryFolder(dir.path()), summary);
+  EXPECT_TRUE(platform::Current().PathExists(summary));
+  EXPECT_EQ(CSettingDBManagement::GetAlertSummaryFolder(dir.path() + platform::kPathSeparator), summary);
   EXPECT_EQ(CSettingDBManagement::GetAlertSummaryFolder(dir.Join(u"a\\b")), dir.Join(u"a\\b\\Alert_Summary"));
-  EXPECT_FALSE(platform::Current().PathExists(dir.Join(u"a")));
-  EXPECT_EQ(CSettingDBManagement::DatabasePath(u"F"), u"F" + sep + u"AlertSummaryDB.db");
+  EXPECT_FALSE(platform::Current().PathExists(dir.Join(u"a"))) << "one level only, and that is no error";
+  EXPECT_EQ(CSettingDBManagement::DatabasePath(u"F"), u"F" + platform::NativeSeparators(u"\\AlertSummaryDB.db"));
 }
 
-TEST(OpenDB, FirstOpenCreatesFileAndTableSecondOnlyOpens) {
+// A new file gets the table; an existing database only a missing table (what
+// a crash during the first creation leaves); a file that is no database is
+// opened and never touched.
+TEST(OpenDB, CreatesTheTableOnlyWhereItIsMissing) {
+  test::StoreDir dir;
+  const std::u16string path = dir.db_path();
+  CSettingDBManagement::GetAlertSummaryFolder(dir.install());
   test::CapturedLog log;
-  StoreDir dir;
-  const std::u16string path = CSettingDBManagement::DatabasePath(CSettingDBManagement::GetAlertSummaryFolder(dir.install()));
-  {
+  for (const char* content : {"(none)", "", "(kept)", "not a database, not SQLite at all"}) {
+    if (std::string(content) != "(none)" && std::string(content) != "(kept)") test::WriteText(path, content);
     CSettingDBManagement store;
-    EXPECT_TRUE(store.OpenDB(path));
+    EXPECT_TRUE(store.OpenDB(path)) << content;
+    const bool database = std::string(content).find("not") == std::string::npos;
+    EXPECT_EQ(store.FillDatainDB(u"", u"", u"", u"", u"", u"", u"", u"", u"", u"", u""), database) << content;
   }
-  EXPECT_EQ(dir.RowCount(), 0);
-  {
-    CSettingDBManagement store;
-    EXPECT_TRUE(store.OpenDB(path)) << "the table exists: a second CREATE would fail";
-    EXPECT_TRUE(store.CloseDB());
-  }
-  const auto messages = log.Messages();
-  ASSERT_EQ(messages.size(), 2u);
-  EXPECT_EQ(messages[0], u"Inside OpenDB function: " + path);
+  EXPECT_EQ(test::ReadText(path), "not a database, not SQLite at all");
+  const std::u16string opened = u"Inside OpenDB function: " + path;
+  const Texts want = {opened, u"Inside FillDatainDB function", ExecuteQueryStatusLine(true),
+                      opened, u"AlertDB table missing in " + path + u"; created it", u"Inside FillDatainDB function",
+                      ExecuteQueryStatusLine(true), opened, u"Inside FillDatainDB function",
+                      ExecuteQueryStatusLine(true), opened, u"Inside FillDatainDB function",
+                      ExecuteQueryStatusLine(false)};
+  EXPECT_EQ(log.Messages(), want);
+  EXPECT_FALSE(CSettingDBManagement().OpenDB(dir.install() + platform::NativeSeparators(u"\\no\\such.db")));
 }
 
-// The table is left alone in a file that already exists, even when empty.
-TEST(OpenDB, ExistingDatabaseWithoutTheTableGetsIt) {
-  StoreDir dir;
-  test::WriteText(dir.db_path(), "");  // what a crash during the first creation leaves
-  test::CapturedLog log;
-  CSettingDBManagement store;
-  EXPECT_TRUE(store.OpenDB(dir.db_path()));
-  EXPECT_TRUE(store.FillDatainDB(u"", u"", u"", u"", u"", u"", u"", u"", u"", u"", u""));
-  EXPECT_EQ(store.ExecuteScalar(u"SELECT count(*) FROM AlertDB"), u"1");
-  EXPECT_EQ(store.ExecuteScalar(u"SELECT sql FROM sqlite_master WHERE name = 'AlertDB'"), CreateAlertTableSql());
-  const auto messages = log.Messages();
-  EXPECT_EQ(std::count(messages.begin(), messages.end(), u"AlertDB table missing in " + dir.db_path() + u"; created it"),
-            1);
-}
-
-TEST(OpenDB, UnusableFilesFailWithoutCrashing) {
-  StoreDir dir;
-  test::WriteText(dir.db_path(), std::string(4096, 'j'));  // not a database
-  CSettingDBManagement store;
-  EXPECT_TRUE(store.OpenDB(dir.db_path())) << "opening reads nothing yet";
-  EXPECT_FALSE(store.ExecuteQuery(u"DELETE FROM AlertDB"));
-  EXPECT_EQ(store.ExecuteScalar(u"SELECT 1 FROM AlertDB"), u"");
-  EXPECT_FALSE(store.OpenDB(dir.folder() + platform::NativeSeparators(u"\\missing\\AlertSummaryDB.db")));
-}
-
-TEST(ExecuteQuery, LogsFirstOutcomeAndRetriesSevenTimesInAll) {
-  StoreDir dir;
+// Seven attempts, each compiling the text afresh, back to back; one log line
+// after the first.
+TEST(ExecuteQuery, MakesSevenAttemptsAndLogsTheFirst) {
+  test::StoreDir dir;
   dir.Create();
+  test::RawConnection other(dir.db_path());
+  test::CapturedLog log;
   CSettingDBManagement store;
   ASSERT_TRUE(store.OpenDB(dir.db_path()));
-  test::CapturedLog log;
-  EXPECT_TRUE(store.ExecuteQuery(u"DELETE FROM AlertDB"));
-  EXPECT_FALSE(store.ExecuteQuery(u"DELETE FROM nothing"));
-  EXPECT_EQ(log.Messages(), (std::vector<std::u16string>{ExecuteQueryStatusLine(true), ExecuteQueryStatusLine(false)}));
-  EXPECT_EQ(ExecuteQueryStatusLine(false), u"Inside ExecuteQuery function - Status: failure");
+  const auto attempts = [&](const std::u16string& sql, bool want) {
+    const uint64_t before = store.Connection().StatementsPrepared();
+    EXPECT_EQ(store.ExecuteQuery(sql), want) << test::Narrow(sql);
+    return store.Connection().StatementsPrepared() - before;
+  };
+  EXPECT_EQ(attempts(u"DELETE FROM AlertDB", true), 1u);
+  EXPECT_EQ(attempts(u"DELETE FROM nothing", false), 7u);
+  ASSERT_EQ(other.Exec("BEGIN EXCLUSIVE"), SQLITE_OK);
+  EXPECT_EQ(attempts(u"DELETE FROM AlertDB", false), 7u) << "a busy database, no allowance to wait";
+  EXPECT_EQ(store.ExecuteScalar(u"SELECT count(*) FROM AlertDB"), u"");
+  EXPECT_EQ(store.Connection().StatementsPrepared(), 17u) << "ExecuteScalar: one attempt";
+  EXPECT_EQ(log.Messages(), (Texts{u"Inside OpenDB function: " + dir.db_path(),
+                                   u"Inside ExecuteQuery function - Status: success",
+                                   u"Inside ExecuteQuery function - Status: failure",
+                                   u"Inside ExecuteQuery function - Status: failure"}));
 }
 
 TEST(FillDatainDB, ValuesLandInTheirColumns) {
-  StoreDir dir;
+  test::StoreDir dir;
   dir.Create();
   CSettingDBManagement store;
   ASSERT_TRUE(store.OpenDB(dir.db_path()));
   // Alert path is the tenth parameter, server name the eleventh.
-  ASSERT_TRUE(store.FillDatainDB(u"Email Alert", u"Type", u"Name", u"2024/03/05 14:07:09", u"N\\A", u"Who",
-                                 u"Op", u"Comp", u"Delivered", u"P", u"S"));
-  // Quotes, a NUL and text beyond the BMP: stored, cut at the NUL.
+  ASSERT_TRUE(store.FillDatainDB(u"Email Alert", u"Type", u"Name", u"2024/03/05 14:07:09", u"N\\A", u"Who", u"Op",
+                                 u"Comp", u"Delivered", u"P", u"S"));
+  // Quotes and text beyond the BMP are stored as they are; a value ends at its NUL.
   ASSERT_TRUE(store.FillDatainDB(u"Script Alert", u"O'Brien's \"type\"", u"'; DROP TABLE AlertDB; --",
                                  std::u16string(u"2024\0junk", 9), u"", u"", u"", u"", u"", u"\U0001F600", u""));
-  ASSERT_TRUE(store.FillDatainDB(u"", u"", u"", u"", u"", u"", u"", u"", u"", u"", u""));
-  const auto rows = dir.Rows();
-  ASSERT_EQ(rows.size(), 3u);
-  EXPECT_EQ(rows[0], (std::vector<std::u16string>{u"Email Alert", u"Type", u"Name", u"2024/03/05 14:07:09", u"N\\A",
-                                                  u"Who", u"Op", u"Comp", u"Delivered", u"S", u"P"}));
-  EXPECT_EQ(rows[1][1], u"O'Brien's \"type\"");
-  EXPECT_EQ(rows[1][2], u"'; DROP TABLE AlertDB; --");
-  EXPECT_EQ(rows[1][3], u"2024");
-  EXPECT_EQ(rows[1][10], u"\U0001F600");
-  EXPECT_EQ(rows[2], std::vector<std::u16string>(11, u""));
+  EXPECT_EQ(dir.Rows(), (std::vector<test::Row>{
+                            {u"Email Alert", u"Type", u"Name", u"2024/03/05 14:07:09", u"N\\A", u"Who", u"Op", u"Comp",
+                             u"Delivered", u"S", u"P"},
+                            {u"Script Alert", u"O'Brien's \"type\"", u"'; DROP TABLE AlertDB; --", u"2024", u"", u"",
+                             u"", u"", u"", u"", u"\U0001F600"}}));
 }
 
 }  // namespace

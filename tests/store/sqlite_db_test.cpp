@@ -1,7 +1,5 @@
 #include "store/sqlite_db.h"
 
-#include <gtest/gtest.h>
-
 #include "store_test_support.h"
 
 namespace asum {
@@ -13,53 +11,55 @@ class SqliteDbTest : public ::testing::Test {
     ASSERT_TRUE(db_.Open(dir_.Join(u"t.db")));
     ASSERT_TRUE(db_.Statement(u"CREATE TABLE t (v TEXT)")->Execute());
   }
-  int64_t Count() {
+  std::u16string Count() {
     auto s = db_.Statement(u"SELECT count(*) FROM t");
-    return s->NextRow() ? std::stoll(test::Narrow(s->ValueString(0))) : -1;
+    return s->NextRow() ? s->ValueString(0) : u"none";
   }
   test::TempDir dir_;
   CDbSQLite db_;
 };
 
-TEST_F(SqliteDbTest, StepResultsFollowTheRowDoneAndErrorRules) {
-  struct Case {
+TEST_F(SqliteDbTest, ExecuteStepsTheFirstStatementOnce) {
+  const struct {
     const char16_t* sql;
     bool execute;
-    int64_t rows_after;
+    const char16_t* rows_after;
   } cases[] = {
-      {u"INSERT INTO t VALUES('a'); INSERT INTO t VALUES('b')", true, 1},  // only the first statement
-      {u"SELECT 1", true, 1},                                            // a SELECT is stepped once and reset
-      {u"", false, 1},                                                   // nothing to compile
-      {u"-- only a comment", false, 1},
-      {u"SELEC nonsense", false, 1},
-      {u"INSERT INTO missing VALUES(1)", false, 1},
+      {u"INSERT INTO t VALUES('a'); INSERT INTO t VALUES('b')", true, u"1"},  // only the first statement
+      {u"SELECT 1 UNION SELECT 2", true, u"1"},
+      {u"", false, u"1"},                                                   // nothing to compile
+      {u"-- only a comment", false, u"1"},
+      {u"SELEC nonsense", false, u"1"},
+      {u"INSERT INTO missing VALUES(1)", false, u"1"},
   };
-  for (const Case& c : cases) {
+  for (const auto& c : cases) {
     EXPECT_EQ(db_.Statement(c.sql)->Execute(), c.execute) << test::Narrow(c.sql);
     EXPECT_EQ(Count(), c.rows_after) << test::Narrow(c.sql);
   }
 }
 
-TEST_F(SqliteDbTest, NextRowWalksRowsThenResets) {
+// A statement that Execute or NextRow ran to a row or to the end is reset:
+// it holds no read lock, so another program can write while it still lives.
+TEST_F(SqliteDbTest, SteppedStatementsAreResetAndLockNothing) {
   ASSERT_TRUE(db_.Statement(u"INSERT INTO t VALUES('x\u00e9\U0001F600')")->Execute());
-  auto none = db_.Statement(u"SELECT v FROM t WHERE 0");
-  EXPECT_FALSE(none->NextRow());
-  EXPECT_FALSE(none->NextRow()) << "reset after the end: stepping again gives the end again";
-  EXPECT_EQ(none->ValueString(0), u"");
-
-  auto one = db_.Statement(u"SELECT v, NULL, 42 FROM t");
-  ASSERT_TRUE(one->NextRow());
-  EXPECT_EQ(one->ValueString(0), u"x\u00e9\U0001F600");
-  EXPECT_EQ(one->ValueString(1), u"");
-  EXPECT_EQ(one->ValueString(2), u"42");
-  EXPECT_EQ(one->ValueString(7), u"");
-  EXPECT_FALSE(one->NextRow());
-  EXPECT_TRUE(one->NextRow()) << "the reset statement starts over";
+  auto rows = db_.Statement(u"SELECT v, NULL, 42 FROM t");
+  ASSERT_TRUE(rows->NextRow());
+  EXPECT_EQ(rows->ValueString(0), u"x\u00e9\U0001F600");
+  EXPECT_EQ(rows->ValueString(1), u"");
+  EXPECT_EQ(rows->ValueString(2), u"42");
+  EXPECT_EQ(rows->ValueString(7), u"");
+  EXPECT_FALSE(rows->NextRow());
+  auto select = db_.Statement(u"SELECT v FROM t UNION ALL SELECT v FROM t");
+  ASSERT_TRUE(select->Execute());
+  test::RawConnection other(dir_.Join(u"t.db"));
+  EXPECT_EQ(other.Exec("BEGIN EXCLUSIVE"), SQLITE_OK) << "a statement left on a row would hold a read lock";
+  EXPECT_EQ(other.Exec("COMMIT"), SQLITE_OK);
+  EXPECT_TRUE(rows->NextRow()) << "the reset statement starts over";
+  EXPECT_TRUE(select->Execute());
 }
 
 TEST_F(SqliteDbTest, CloseFinalizesLiveStatementsWhichThenFailSafely) {
-  EXPECT_TRUE(db_.Statement(u"INSERT INTO t VALUES('a')")->Execute());
-  auto open_read = db_.Statement(u"SELECT v FROM t");
+  auto open_read = db_.Statement(u"SELECT 1 UNION SELECT 2");
   ASSERT_TRUE(open_read->NextRow());  // left on its row: the connection is busy
   auto never_stepped = db_.Statement(u"SELECT 1");
   EXPECT_TRUE(db_.Close());
@@ -68,23 +68,14 @@ TEST_F(SqliteDbTest, CloseFinalizesLiveStatementsWhichThenFailSafely) {
   EXPECT_FALSE(never_stepped->Execute());
   EXPECT_EQ(open_read->ValueString(0), u"");
   EXPECT_TRUE(db_.Close()) << "closing nothing";
-  // The statements outlive the connection; their destruction must not touch it.
-  open_read.reset();
+  open_read.reset();  // the statements outlive the connection; going must not touch it
   never_stepped.reset();
   EXPECT_FALSE(db_.Statement(u"SELECT 1")->Execute());
-  // The file is free again: a new connection writes to it.
   ASSERT_TRUE(db_.Open(dir_.Join(u"t.db")));
-  EXPECT_TRUE(db_.Statement(u"INSERT INTO t VALUES('b')")->Execute());
-  EXPECT_EQ(Count(), 2);
-}
-
-TEST(SqliteDbOpen, FailingOpenLeavesNothingOpen) {
-  test::TempDir dir;
-  CDbSQLite db;
-  EXPECT_FALSE(db.Open(dir.Join(u"missing\\sub\\t.db")));
-  EXPECT_FALSE(db.IsOpen());
-  EXPECT_FALSE(db.Open(dir.path())) << "a folder is not a database";
-  EXPECT_FALSE(db.Statement(u"SELECT 1")->NextRow());
+  EXPECT_TRUE(db_.Statement(u"INSERT INTO t VALUES('b')")->Execute()) << "the file is free again";
+  EXPECT_FALSE(db_.Open(dir_.Join(u"missing\\sub\\t.db")));
+  EXPECT_FALSE(db_.IsOpen());
+  EXPECT_FALSE(db_.Open(dir_.path())) << "a folder is not a database";
 }
 
 }  // namespace
