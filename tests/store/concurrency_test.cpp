@@ -11,44 +11,39 @@
 namespace asum {
 namespace {
 
-constexpr char16_t kMarch[] = u"<TO>2024/03/01 00:00:00</FROM><TO>2024/03/31 23:59:59</TO>";
-
 bool InsertOne(const test::StoreDir& dir, BusyBudget* budget, const std::u16string& when) {
   CSettingDBManagement store(budget);
-  return store.OpenDB(dir.db_path()) &&
-         store.FillDatainDB(u"Email Alert", u"T", u"N", when, u"No", u"", u"", u"", u"Delivered", u"p", u"s");
+  return store.OpenDB(dir.db_path()) && store.FillDatainDB(u"Email Alert", u"T", u"N", when, u"No", u"", u"", u"",
+                                                           u"Delivered", u"p", u"s");
 }
 
 TEST(StoreConcurrency, InsertCountAndPurgeAtOnceAllSucceed) {
   test::StoreDir dir;
-  dir.Create();
-  dir.Insert(std::vector<std::array<std::u16string, 3>>(50, {u"Email Alert", u"T", u"2024/03/02 00:00:00"}));
+  dir.Create(std::vector<std::array<std::u16string, 3>>(50, {u"Email Alert", u"T", u"2024/03/02 00:00:00"}));
   constexpr int kInserts = 120;
   std::atomic<bool> done{false};
   std::atomic<int> failures{0};
   std::thread inserter([&] {
     for (int i = 0; i < kInserts && failures == 0; ++i) {
-      BusyBudget budget(kProcessingBusyBudgetMs);  // one cycle's allowance per file
-      if (!InsertOne(dir, &budget, i % 2 ? u"2024/03/10 10:00:00" : u"2000/01/01 00:00:00")) ++failures;
+      BusyBudget cycle(kProcessingBusyBudgetMs);
+      if (!InsertOne(dir, &cycle, i % 2 ? u"2024/03/10 10:00:00" : u"2000/01/01 00:00:00")) ++failures;
     }
     done = true;
   });
   const auto counter = [&] {
     do {
-      const int n = CountAlerts(dir.install(), u"Email Alert", kMarch);
-      if (n < 50 || n > 50 + kInserts / 2) ++failures;
+      const int n = CountAlerts(dir.install(), u"Email Alert", u"<TO>2024/03/01</FROM><TO>2024/03/31</TO>");
+      failures += n < 50 || n > 50 + kInserts / 2;
     } while (!done);
   };
-  std::thread counter1(counter), counter2(counter);
-  std::thread purger([&] {
-    do {
-      if (DeleteOldAlerts(dir.install(), u"2001/01/01 00:00:00") != 1) ++failures;
-    } while (!done);
+  std::thread counter1(counter), counter2(counter), purger([&] {
+    do failures += DeleteOldAlerts(dir.install(), u"2001/01/01 00:00:00") != 1;
+    while (!done);
   });
   for (std::thread* t : {&inserter, &counter1, &counter2, &purger}) t->join();
   EXPECT_EQ(failures.load(), 0);
   EXPECT_EQ(DeleteOldAlerts(dir.install(), u"2001/01/01 00:00:00"), 1);
-  EXPECT_EQ(dir.Rows().size(), 50u + kInserts / 2);
+  EXPECT_EQ(dir.Column().size(), 50u + kInserts / 2);
 }
 
 // Lets the other program commit as soon as a statement has to wait for it.
@@ -84,7 +79,7 @@ TEST(StoreConcurrency, StatementsWaitForAWriterInsteadOfFailing) {
   hold();
   EXPECT_TRUE(store.FillDatainDB(u"", u"", u"", u"", u"", u"", u"", u"", u"", u"", u""));
   EXPECT_EQ(budget.waits, 3);
-  EXPECT_EQ(dir.Rows().size(), 2u);
+  EXPECT_EQ(dir.Column().size(), 2u);
 }
 
 // A database held for minutes costs a cycle its allowance once, not once per

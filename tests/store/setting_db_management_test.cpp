@@ -9,11 +9,10 @@ namespace {
 using Texts = std::vector<std::u16string>;
 
 TEST(AlertTable, CreateStatementIsExact) {
-  const std::u16string tabs(8, u'\t');
   std::u16string expected = u"CREATE TABLE AlertDB (";
   for (const char16_t* column : {u"Alert Action", u"Alert Type", u"Alert Name", u"When", u"Threshold", u"Who",
                                  u"Operation", u"Component Name", u"EmailStatus", u"Server Name", u"Alert Path"}) {
-    expected += tabs + u" \"" + column + u"\"\tTEXT NOT NULL,";
+    expected += std::u16string(8, u'\t') + u" \"" + column + u"\"\tTEXT NOT NULL,";
   }
   expected.back() = u')';
   EXPECT_EQ(CreateAlertTableSql(), expected);
@@ -23,63 +22,57 @@ TEST(AlertTable, CreateStatementIsExact) {
 TEST(AlertSummaryFolder, JoinsAndCreatesOneLevel) {
   test::TempDir dir;
   const std::u16string summary = dir.Join(u"Alert_Summary");
-  EXPECT_EQ(CSettingDBManagement::GetAlertSummaryFolder(dir.path()), summary);
-  EXPECT_TRUE(platform::Current().PathExists(summary));
   EXPECT_EQ(CSettingDBManagement::GetAlertSummaryFolder(dir.path() + platform::kPathSeparator), summary);
+  EXPECT_TRUE(platform::Current().PathExists(summary));
   EXPECT_EQ(CSettingDBManagement::GetAlertSummaryFolder(dir.Join(u"a\\b")), dir.Join(u"a\\b\\Alert_Summary"));
   EXPECT_FALSE(platform::Current().PathExists(dir.Join(u"a"))) << "one level only, and that is no error";
   EXPECT_EQ(CSettingDBManagement::DatabasePath(u"F"), u"F" + platform::NativeSeparators(u"\\AlertSummaryDB.db"));
 }
 
-// A new file gets the table; an existing database only a missing table (what
-// a crash during the first creation leaves); a file that is no database is
-// opened and never touched.
+// A new file gets the table; an existing database gets only a missing table
+// (what a crash during the first creation leaves); a file that is no database
+// is opened and never touched.
 TEST(OpenDB, CreatesTheTableOnlyWhereItIsMissing) {
   test::StoreDir dir;
   const std::u16string path = dir.db_path();
+  const std::string junk = "not a database, not SQLite at all";
   CSettingDBManagement::GetAlertSummaryFolder(dir.install());
   test::CapturedLog log;
-  for (const char* content : {"(none)", "", "(kept)", "not a database, not SQLite at all"}) {
-    if (std::string(content) != "(none)" && std::string(content) != "(kept)") test::WriteText(path, content);
+  for (const char* content : {"(new)", "", "(kept)", junk.c_str()}) {
+    if (*content != '(') test::WriteText(path, content);
     CSettingDBManagement store;
     EXPECT_TRUE(store.OpenDB(path)) << content;
-    const bool database = std::string(content).find("not") == std::string::npos;
-    EXPECT_EQ(store.FillDatainDB(u"", u"", u"", u"", u"", u"", u"", u"", u"", u"", u""), database) << content;
+    EXPECT_EQ(store.FillDatainDB(u"", u"", u"", u"", u"", u"", u"", u"", u"", u"", u""), content != junk) << content;
   }
-  EXPECT_EQ(test::ReadText(path), "not a database, not SQLite at all");
-  const std::u16string opened = u"Inside OpenDB function: " + path;
-  const Texts want = {opened, u"Inside FillDatainDB function", ExecuteQueryStatusLine(true),
-                      opened, u"AlertDB table missing in " + path + u"; created it", u"Inside FillDatainDB function",
-                      ExecuteQueryStatusLine(true), opened, u"Inside FillDatainDB function",
-                      ExecuteQueryStatusLine(true), opened, u"Inside FillDatainDB function",
-                      ExecuteQueryStatusLine(false)};
-  EXPECT_EQ(log.Messages(), want);
+  EXPECT_EQ(test::ReadText(path), junk);
+  const std::u16string open = u"Inside OpenDB function: " + path, fill = u"Inside FillDatainDB function";
+  const std::u16string ok = u"Inside ExecuteQuery function - Status: success";
+  EXPECT_EQ(log.Messages(), (Texts{open, fill, ok, open, u"AlertDB table missing in " + path + u"; created it", fill,
+                                   ok, open, fill, ok, open, fill, u"Inside ExecuteQuery function - Status: failure"}));
   EXPECT_FALSE(CSettingDBManagement().OpenDB(dir.install() + platform::NativeSeparators(u"\\no\\such.db")));
 }
 
-// Seven attempts, each compiling the text afresh, back to back; one log line
-// after the first.
-TEST(ExecuteQuery, MakesSevenAttemptsAndLogsTheFirst) {
+// Seven attempts, each compiling the text afresh; ExecuteScalar makes one.
+TEST(ExecuteQuery, MakesSevenAttemptsAndLogsOnlyTheFirst) {
   test::StoreDir dir;
   dir.Create();
   test::RawConnection other(dir.db_path());
-  test::CapturedLog log;
   CSettingDBManagement store;
   ASSERT_TRUE(store.OpenDB(dir.db_path()));
-  const auto attempts = [&](const std::u16string& sql, bool want) {
+  test::CapturedLog log;
+  const auto attempts = [&](const auto& run) {
     const uint64_t before = store.Connection().StatementsPrepared();
-    EXPECT_EQ(store.ExecuteQuery(sql), want) << test::Narrow(sql);
+    run();
     return store.Connection().StatementsPrepared() - before;
   };
-  EXPECT_EQ(attempts(u"DELETE FROM AlertDB", true), 1u);
-  EXPECT_EQ(attempts(u"DELETE FROM nothing", false), 7u);
-  ASSERT_EQ(other.Exec("BEGIN EXCLUSIVE"), SQLITE_OK);
-  EXPECT_EQ(attempts(u"DELETE FROM AlertDB", false), 7u) << "a busy database, no allowance to wait";
-  EXPECT_EQ(store.ExecuteScalar(u"SELECT count(*) FROM AlertDB"), u"");
-  EXPECT_EQ(store.Connection().StatementsPrepared(), 17u) << "ExecuteScalar: one attempt";
-  EXPECT_EQ(log.Messages(), (Texts{u"Inside OpenDB function: " + dir.db_path(),
-                                   u"Inside ExecuteQuery function - Status: success",
-                                   u"Inside ExecuteQuery function - Status: failure",
+  EXPECT_EQ(attempts([&] { EXPECT_TRUE(store.ExecuteQuery(u"DELETE FROM AlertDB")); }), 1u);
+  EXPECT_EQ(attempts([&] { EXPECT_FALSE(store.ExecuteQuery(u"DELETE FROM nothing")); }), 7u);
+  ASSERT_EQ(other.Exec("BEGIN EXCLUSIVE"), SQLITE_OK);  // busy, and no allowance to wait
+  EXPECT_EQ(attempts([&] { EXPECT_FALSE(store.FillDatainDB(u"", u"", u"", u"", u"", u"", u"", u"", u"", u"", u"")); }),
+            7u);
+  EXPECT_EQ(attempts([&] { EXPECT_EQ(store.ExecuteScalar(u"SELECT count(*) FROM AlertDB"), u""); }), 1u);
+  EXPECT_EQ(log.Messages(), (Texts{u"Inside ExecuteQuery function - Status: success",
+                                   u"Inside ExecuteQuery function - Status: failure", u"Inside FillDatainDB function",
                                    u"Inside ExecuteQuery function - Status: failure"}));
 }
 
@@ -88,17 +81,17 @@ TEST(FillDatainDB, ValuesLandInTheirColumns) {
   dir.Create();
   CSettingDBManagement store;
   ASSERT_TRUE(store.OpenDB(dir.db_path()));
-  // Alert path is the tenth parameter, server name the eleventh.
+  // Alert path is the tenth parameter, server name the eleventh; quotes are
+  // stored as they are, and a value ends at its NUL.
   ASSERT_TRUE(store.FillDatainDB(u"Email Alert", u"Type", u"Name", u"2024/03/05 14:07:09", u"N\\A", u"Who", u"Op",
                                  u"Comp", u"Delivered", u"P", u"S"));
-  // Quotes and text beyond the BMP are stored as they are; a value ends at its NUL.
-  ASSERT_TRUE(store.FillDatainDB(u"Script Alert", u"O'Brien's \"type\"", u"'; DROP TABLE AlertDB; --",
+  ASSERT_TRUE(store.FillDatainDB(u"A", u"O'Brien's \"type\"", u"'; DROP TABLE AlertDB; --",
                                  std::u16string(u"2024\0junk", 9), u"", u"", u"", u"", u"", u"\U0001F600", u""));
-  EXPECT_EQ(dir.Rows(), (std::vector<test::Row>{
-                            {u"Email Alert", u"Type", u"Name", u"2024/03/05 14:07:09", u"N\\A", u"Who", u"Op", u"Comp",
-                             u"Delivered", u"S", u"P"},
-                            {u"Script Alert", u"O'Brien's \"type\"", u"'; DROP TABLE AlertDB; --", u"2024", u"", u"",
-                             u"", u"", u"", u"", u"\U0001F600"}}));
+  EXPECT_EQ(dir.Column("\"Alert Action\"||'|'||\"Alert Type\"||'|'||\"Alert Name\"||'|'||\"When\"||'|'||\"Threshold\""
+                       "||'|'||\"Who\"||'|'||\"Operation\"||'|'||\"Component Name\"||'|'||\"EmailStatus\"||'|'||"
+                       "\"Server Name\"||'|'||\"Alert Path\""),
+            (Texts{u"Email Alert|Type|Name|2024/03/05 14:07:09|N\\A|Who|Op|Comp|Delivered|S|P",
+                   u"A|O'Brien's \"type\"|'; DROP TABLE AlertDB; --|2024|||||||\U0001F600"}));
 }
 
 }  // namespace

@@ -18,6 +18,19 @@ namespace {
 fs::path ToPath(const std::u16string& p) { return fs::path(p); }
 std::u16string FromPath(const fs::path& p) { return p.u16string(); }
 
+// No test program writes the machine's diagnostic log, which a test of the
+// whole library may have switched on: until a test captures the log, it goes
+// to a folder that does not exist.
+class NoMachineLog : public ::testing::Environment {
+ public:
+  void SetUp() override { platform::SetLogFolder(missing_.Join(u"missing")); }
+
+ private:
+  TempDir missing_;
+};
+[[maybe_unused]] ::testing::Environment* const g_no_machine_log =
+    ::testing::AddGlobalTestEnvironment(new NoMachineLog);
+
 }  // namespace
 
 std::string Narrow(std::u16string_view text) { return Utf16ToUtf8(text); }
