@@ -13,10 +13,8 @@ namespace asum::mail {
 namespace {
 
 TEST(MimeParameter, ReadsPlainAndRfc2231Forms) {
-  struct Case {
-    const char* value;
-    const char* name;
-    const char* expected;  // null: absent
+  const struct {
+    const char *value, *name, *expected;  // null: absent
   } cases[] = {
       {"text/plain; Name=\"a;b\\\"c\"; name=second", "name", "a;b\"c"},
       {"text/plain; name=plain.txt; name*=iso-8859-1'fr'caf%E9.txt", "name", "caf\xC3\xA9.txt"},
@@ -28,60 +26,41 @@ TEST(MimeParameter, ReadsPlainAndRfc2231Forms) {
       {"text/plain; filename*=utf-8''x", "name", nullptr},
       {"text/plain; name", "name", nullptr},
   };
-  for (const Case& c : cases) {
+  for (const auto& c : cases) {
     EXPECT_EQ(Parameter(c.value, c.name).value_or("(absent)"), c.expected ? c.expected : "(absent)") << c.value;
   }
   EXPECT_EQ(MainValue(" text/html ; charset=x"), "text/html");
 }
 
 TEST(DecodeTransfer, InvalidInputDecodesAsFarAsItMakesSense) {
-  struct Case {
-    const char* encoding;
-    std::string input;
-    std::string output;
+  const std::string b64 = "base64", qp = "quoted-printable";
+  const struct {
+    std::string encoding, input, output;
   } cases[] = {
-      {"base64", "QUJD", "ABC"},          {"BASE64", "QU\r\nJD\r\n", "ABC"}, {"base64", "QQ==QkM=", "ABC"},
-      {"base64", "Q*U!J D", "ABC"},       {"base64", "Q", ""},               {"base64", "====", ""},
-      {"quoted-printable", "a=3Db", "a=b"},
-      {"quoted-printable", "soft=\r\nbreak=\nend", "softbreakend"},
-      {"quoted-printable", "trail= \r\nx", "trailx"},
-      {"quoted-printable", "bad=ZZ=4", "bad=ZZ=4"},
-      {"quoted-printable", "end=", "end"},
-      {"Quoted-Printable", "=e9", "\xE9"},
-      {"7bit", "=41", "=41"},             {"x-unknown", "QUJD", "QUJD"},
+      {b64, "QUJD", "ABC"}, {"BASE64", "QU\r\nJD\r\n", "ABC"}, {b64, "QQ==QkM=", "ABC"}, {b64, "Q*U!J D", "ABC"},
+      {b64, "Q", ""},       {b64, "====", ""},                 {qp, "a=3Db", "a=b"},  {qp, "end=", "end"},
+      {qp, "soft=\r\nbreak=\nend", "softbreakend"},         {qp, "trail= \r\nx", "trailx"},
+      {qp, "bad=ZZ=4", "bad=ZZ=4"}, {"Quoted-Printable", "=e9", "\xE9"}, {"7bit", "=41", "=41"},
+      {"x-unknown", "QUJD", "QUJD"},
   };
-  for (const Case& c : cases) EXPECT_EQ(DecodeTransfer(c.input, c.encoding), c.output) << c.input;
+  for (const auto& c : cases) EXPECT_EQ(DecodeTransfer(c.input, c.encoding), c.output) << c.input;
 }
 
 TEST(IsAttachment, RulesInOrder) {
-  struct Case {
-    const char* type;
-    const char* disposition;
-    const char* file_name;
-    const char* encoding;
+  const struct {
     bool attachment;
+    std::string type, disposition = "", file_name = "", encoding = "";
   } cases[] = {
-      {"multipart/mixed", "attachment", "a.pem", "base64", false},
-      {"Multipart/Related", "attachment", "", "", false},
-      {"message/rfc822", "attachment", "Saved.MHT", "", true},
-      {"message/rfc822", "attachment", "mail.eml", "", false},
-      {"message/rfc822", "inline", "a.mht", "", false},
-      {"text/plain", "ATTACHMENT", "", "", true},
-      {"text/plain", "inline", "x.txt", "Base64", true},
-      {"text/plain", "inline", "", "base64", false},
-      {"text/plain", "inline", "x.txt", "7bit", false},
-      {"text/plain", "", "key.PEM", "", true},
-      {"application/edifact", "", "", "", true},
-      {"application/smil", "", "", "", true},
-      {"Application/EDIFACT", "", "", "", false},
-      {"application/pdf", "", "", "", false},
+      {false, "multipart/mixed", "attachment", "a.pem", "base64"}, {false, "Multipart/Related", "attachment"},
+      {true, "message/rfc822", "attachment", "Saved.MHT"},       {false, "message/rfc822", "attachment", "mail.eml"},
+      {false, "message/rfc822", "inline", "a.mht"},              {true, "text/plain", "ATTACHMENT"},
+      {true, "text/plain", "inline", "x.txt", "Base64"},         {false, "text/plain", "inline", "", "base64"},
+      {false, "text/plain", "inline", "x.txt", "7bit"},          {true, "text/plain", "", "key.PEM"},
+      {true, "application/edifact"}, {true, "application/smil"}, {false, "Application/EDIFACT"},
+      {false, "application/pdf"},
   };
-  for (const Case& c : cases) {
-    MimePart part;
-    part.content_type = c.type;
-    part.disposition = c.disposition;
-    part.file_name = c.file_name;
-    part.transfer_encoding = c.encoding;
+  for (const auto& c : cases) {
+    MimePart part{c.type, c.disposition, c.file_name, c.encoding, "", {}};
     EXPECT_EQ(IsAttachment(part), c.attachment) << c.type << " " << c.disposition << " " << c.file_name;
   }
 }

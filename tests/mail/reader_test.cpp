@@ -13,28 +13,16 @@ using platform::SystemTime;
 using test::TempDir;
 
 const std::string kAlternative =
-    "From: \"Alert, Service\" <alerts@example.com>\r\n"
-    "Subject: =?utf-8?B?RGlzayBmdWxsIOKAkyBzZXJ2ZXIx?=\r\n"
-    "Date: Mon, 11 Jun 2018 09:05:03 +0530\r\n"
-    "MIME-Version: 1.0\r\n"
-    "Content-Type: multipart/alternative;\r\n"
-    "\tboundary=\"b1\"\r\n"
-    "\r\n"
-    "preamble\r\n"
-    "--b1\r\n"
-    "Content-Type: text/plain; charset=us-ascii\r\n"
-    "\r\n"
-    "plain text\r\n"
-    "--b1\r\n"
-    "Content-Type: text/html; charset=iso-8859-1\r\n"
-    "Content-Transfer-Encoding: quoted-printable\r\n"
-    "\r\n"
-    "<p>Caf=E9 =\r\nover</p>\r\n"
-    "--b1--\r\n"
-    "epilogue\r\n";
+    "From: \"Alert, Service\" <alerts@example.com>\r\nSubject: =?utf-8?B?RGlzayBmdWxsIOKAkyBzZXJ2ZXIx?=\r\n"
+    "Date: Mon, 11 Jun 2018 09:05:03 +0530\r\nMIME-Version: 1.0\r\nContent-Type: multipart/alternative;\r\n"
+    "\tboundary=\"b1\"\r\n\r\npreamble\r\n--b1\r\nContent-Type: text/plain; charset=us-ascii\r\n\r\nplain\r\n"
+    "--b1\r\nContent-Type: text/html; charset=iso-8859-1\r\nContent-Transfer-Encoding: quoted-printable\r\n\r\n"
+    "<p>Caf=E9 =\r\nover</p>\r\n--b1--\r\nepilogue\r\n";
 
 std::string Replaced(std::string text, const std::string& from, const std::string& to) {
-  for (size_t pos = 0; (pos = text.find(from, pos)) != std::string::npos; pos += to.size()) text.replace(pos, from.size(), to);
+  for (size_t at = text.find(from); at != std::string::npos; at = text.find(from, at + to.size())) {
+    text.replace(at, from.size(), to);
+  }
   return text;
 }
 
@@ -104,7 +92,9 @@ TEST(CkEmail, GettersAnswerTheLastLoadedMessage) {
   CkString from, subject, body;
   SystemTime date;
   ASSERT_TRUE(email.LoadEml(good));
-  for (const char16_t* bad : {u"missing.eml", u"folder.eml", u"unreadable.eml"}) EXPECT_FALSE(email.LoadEml(dir.Join(bad)));
+  for (const char16_t* bad : {u"missing.eml", u"folder.eml", u"unreadable.eml"}) {
+    EXPECT_FALSE(email.LoadEml(dir.Join(bad))) << "a failed load keeps the message";
+  }
   email.get_FromAddress(from), email.get_Subject(subject), email.get_Body(body), email.get_LocalDate(date);
   EXPECT_STREQ(from.getString(), "alerts@example.com");
   EXPECT_EQ(test::Narrow(subject.getStringU()), "Disk full \xE2\x80\x93 server1");

@@ -97,6 +97,24 @@ TEST(PlatformFiles, NamesThatAreNotUtf8GoBackToTheSystemByteForByte) {
     EXPECT_TRUE(std::filesystem::exists(folder / ("PROC_" + c.bytes))) << c.bytes;
   }
 }
+
+// Linux keeps each settings key as a folder below the settings root and each
+// string value as a file of UTF-8 text, which ends at its first NUL.
+TEST(PlatformSettings, KeysAreFoldersAndValuesFilesOfText) {
+  test::TempDir root;
+  const std::u16string previous = platform::SettingsRoot();
+  platform::SetSettingsRoot(root.path());
+  platform::Env& env = platform::Env::Default();
+  EXPECT_EQ(env.OpenKey(platform::Env::LocalMachine(), u"software"), nullptr);
+  platform::SettingsKey key = env.CreateKey(platform::Env::LocalMachine(), u"software");
+  ASSERT_NE(key, nullptr);
+  test::WriteText(root.Join(u"software/v"), std::string("caf\xC3\xA9\0rest", 10));
+  EXPECT_EQ(env.QueryStringValue(key, u"v"), u"caf\u00e9");
+  EXPECT_EQ(env.QueryStringValue(key, u"missing"), std::nullopt);
+  EXPECT_EQ(env.CreateKey(key, u".."), nullptr);
+  env.CloseKey(key);
+  platform::SetSettingsRoot(previous);
+}
 #endif
 
 #ifdef _WIN32

@@ -16,26 +16,23 @@ namespace {
 using platform::SystemTime;
 
 #ifndef _WIN32
-// Sets or unsets environment variables for the object's lifetime.
-class ScopedVariables {
+// Sets (null: unsets) an environment variable until the object goes.
+class ScopedVariable {
  public:
-  ScopedVariables(std::initializer_list<std::pair<const char*, const char*>> values) {
-    for (const auto& [name, value] : values) {
-      const char* old = std::getenv(name);
-      saved_.push_back({name, old ? std::optional<std::string>(old) : std::nullopt});
-      Set(name, value);
-    }
+  ScopedVariable(const char* name, const char* value) : name_(name), had_(std::getenv(name) != nullptr) {
+    if (had_) old_ = std::getenv(name);
+    Set(name_, value);
   }
-  ~ScopedVariables() {
-    for (const auto& [name, value] : saved_) Set(name, value ? value->c_str() : nullptr);
-  }
+  ~ScopedVariable() { Set(name_, had_ ? old_.c_str() : nullptr); }
 
  private:
   static void Set(const char* name, const char* value) {
     value ? setenv(name, value, 1) : unsetenv(name);
     tzset();
   }
-  std::vector<std::pair<const char*, std::optional<std::string>>> saved_;
+  const char* name_;
+  bool had_;
+  std::string old_;
 };
 
 // The log's timestamp follows the locale the environment names, as the user's
@@ -57,7 +54,7 @@ TEST(TimestampText, FollowsTheEnvironmentsLocale) {
   };
   for (const auto& c : cases) {
     if (!german && c.expected == kGerman) continue;
-    ScopedVariables env{{"LC_ALL", c.lc_all}, {"LC_TIME", c.lc_time}, {"LANG", c.lang}};
+    ScopedVariable all("LC_ALL", c.lc_all), time("LC_TIME", c.lc_time), lang("LANG", c.lang);
     EXPECT_EQ(test::Narrow(platform::Env::Default().TimestampText(SystemTime{2026, 12, 1, 7, 1, 2, 3, 0})), c.expected)
         << (c.lc_all ? c.lc_all : "-") << " " << (c.lc_time ? c.lc_time : "-") << " " << (c.lang ? c.lang : "-");
   }
@@ -68,7 +65,7 @@ TEST(TimestampText, FollowsTheEnvironmentsLocale) {
 // sets a zone five and a half hours east; Windows keeps the machine's.)
 TEST(UtcToLocal, AgreesWithTheBiasAndRefusesImpossibleTimes) {
 #ifndef _WIN32
-  ScopedVariables zone{{"TZ", "XST-05:30"}};
+  ScopedVariable zone("TZ", "XST-05:30");
   EXPECT_EQ(platform::Env::Default().CurrentBiasMinutes(), -330);
   EXPECT_EQ(platform::Env::Default().UtcToLocal(SystemTime{2024, 12, 2, 31, 20, 0, 5, 7}),
             (SystemTime{2025, 1, 3, 1, 1, 30, 5, 7}));

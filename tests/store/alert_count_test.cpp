@@ -36,6 +36,7 @@ TEST(BuildCountStatement, NamesTheColumnsAsTheTableDoes) {
       {u"Email Alert", date + u"(\"Alert Action\" LIKE '%'||?3||'%')"},
       {u"x Script Alert", date + u"(\"Alert Action\" LIKE '%'||?3||'%')"},
       {u"email alert", date + u"(\"Alert Type\" LIKE '%'||?3||'%')"},
+      {u"Script", date + u"(\"Alert Type\" LIKE '%'||?3||'%')"},
   };
   for (const auto& [filter, sql] : cases) EXPECT_EQ(BuildCountStatement(filter, kMarch).sql, sql);
   EXPECT_EQ(BuildCountStatement(u"", u"</FROM>").sql,

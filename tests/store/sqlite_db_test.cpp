@@ -15,7 +15,8 @@ TEST(CSqlStatement, StepsTheFirstStatementAndResetsIt) {
     bool execute;
   } cases[] = {
       {u"INSERT INTO t VALUES('x\u00e9\U0001F600'); INSERT INTO t VALUES('b')", true},  // the first one only
-      {u"", false}, {u"-- only a comment", false}, {u"SELEC nonsense", false}, {u"INSERT INTO missing VALUES(1)", false},
+      {u"", false}, {u"-- only a comment", false}, {u"SELEC nonsense", false},
+      {u"INSERT INTO missing VALUES(1)", false},
   };
   for (const auto& c : cases) EXPECT_EQ(db.Statement(c.sql)->Execute(), c.execute) << test::Narrow(c.sql);
   auto rows = db.Statement(u"SELECT v, NULL, 42 FROM t");

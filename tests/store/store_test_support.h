@@ -72,26 +72,21 @@ class StoreEnv : public platform::Env {
   }
   platform::SystemTime LocalNow() override { return {2024, 3, 3, 20, 13, 45, 0, 0}; }
   std::u16string ExecutablePath() override { return executable; }
-  platform::SettingsKey OpenKey(platform::SettingsKey parent, const std::u16string& name) override {
-    return keys.count(Path(parent, name)) ? CreateKey(parent, name) : nullptr;
-  }
-  platform::SettingsKey CreateKey(platform::SettingsKey parent, const std::u16string& name) override {
-    ++open_keys;
-    return new std::u16string(*keys.insert(Path(parent, name)).first);
-  }
-  std::optional<std::u16string> QueryStringValue(platform::SettingsKey key, const std::u16string& name) override {
-    const auto found = values.find(*static_cast<std::u16string*>(key) + u"\\" + name);
-    return found == values.end() ? std::nullopt : std::optional(found->second);
-  }
-  void CloseKey(platform::SettingsKey key) override {
-    --open_keys;
-    delete static_cast<std::u16string*>(key);
-  }
-
- private:
-  static std::u16string Path(platform::SettingsKey parent, const std::u16string& name) {
+  using Key = platform::SettingsKey;
+  static std::u16string Path(Key parent, const std::u16string& name) {
     return parent == LocalMachine() ? name : *static_cast<std::u16string*>(parent) + u"\\" + name;
   }
+  Key OpenKey(Key parent, const std::u16string& name) override {
+    return keys.count(Path(parent, name)) ? CreateKey(parent, name) : nullptr;
+  }
+  Key CreateKey(Key parent, const std::u16string& name) override {
+    return ++open_keys, new std::u16string(*keys.insert(Path(parent, name)).first);
+  }
+  std::optional<std::u16string> QueryStringValue(Key key, const std::u16string& name) override {
+    const auto found = values.find(Path(key, name));
+    return found == values.end() ? std::nullopt : std::optional(found->second);
+  }
+  void CloseKey(Key key) override { --open_keys, delete static_cast<std::u16string*>(key); }
 };
 
 }  // namespace asum::test
