@@ -106,8 +106,8 @@ TEST_F(RetentionTest, UnusableDatabasesGiveZeroAndKeepTheirRows) {
   }
   test::UnwritableFile file(dir_.db_path());
   if (!file.unwritable()) {
-    GTEST_SKIP() << "this user writes read-only files, and this file system or user cannot set the immutable "
-                    "attribute (chattr +i needs CAP_LINUX_IMMUTABLE and ext2/3/4, XFS or Btrfs)";
+    GTEST_SKIP() << "neither read-only permissions nor the immutable attribute keep this user from writing here "
+                    "(chattr +i needs Linux, root and ext2/3/4, XFS or Btrfs; Wine as root writes read-only files)";
   }
   EXPECT_EQ(CountAlerts(dir_.install(), u"", u"</FROM>"), 6) << "a read-only database is still counted";
   EXPECT_EQ(RunRetentionProc(dir_.install(), 20), 0);
