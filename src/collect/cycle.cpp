@@ -12,8 +12,11 @@ std::u16string DatabasePathOf(const std::u16string& install_folder) {
 }
 
 std::u16string CollectorLockPathOf(const std::u16string& install_folder) {
-  return CSettingDBManagement::GetAlertSummaryFolder(install_folder) +
-         platform::NativeSeparators(u"\\AlertSummaryDB.collector.lock");
+  return CollectorLockPathIn(CSettingDBManagement::GetAlertSummaryFolder(install_folder));
+}
+
+std::u16string CollectorLockPathIn(const std::u16string& summary_folder) {
+  return summary_folder + platform::NativeSeparators(u"\\AlertSummaryDB.collector.lock");
 }
 
 CycleResult RunLockedCycle(const std::u16string& install_folder, const AlertFileProcessor& process) {

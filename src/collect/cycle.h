@@ -21,6 +21,8 @@ enum class CycleResult {
 std::u16string DatabasePathOf(const std::u16string& install_folder);
 // The collector lock file, beside the database.
 std::u16string CollectorLockPathOf(const std::u16string& install_folder);
+// The lock file in a database folder, for readers that must not create the folder.
+std::u16string CollectorLockPathIn(const std::u16string& summary_folder);
 
 // Takes the collector lock without waiting, checks that the database (when it
 // exists) is one, and runs one collection cycle over `install_folder`.

@@ -9,13 +9,6 @@ namespace {
 
 using platform::NativeSeparators;
 
-const char16_t* const kFixedComponents[] = {
-    u"Activity Outside of Business Hours_Alert",
-    u"All Environment Changes",
-    u"Predefine Alerts",
-    u"Anomaly Alerts",
-};
-
 bool HasMarkerFile(platform::Env& env, const std::u16string& path, const std::u16string& name) {
   const std::u16string markers[] = {
       path + NativeSeparators(u"\\info.dat"),
@@ -84,7 +77,7 @@ void RunCollectionCycle(const std::u16string& install_folder, const AlertFilePro
   platform::Env& env = platform::Current();
   StringList components;
   GetComponentFolders(install_folder, components);
-  for (const char16_t* name : kFixedComponents) {
+  for (const char16_t* name : kFixedComponentFolders) {
     if (!env.PathExists(install_folder + platform::kPathSeparator + name)) continue;
     components.push_back(name);
     if (std::u16string(name) == u"Anomaly Alerts") {

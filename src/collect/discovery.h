@@ -7,6 +7,7 @@
 // Nothing is thrown.
 #pragma once
 
+#include <array>
 #include <functional>
 #include <string>
 #include <vector>
@@ -18,6 +19,15 @@ using StringList = std::vector<std::u16string>;
 // The platform's directory search refuses patterns of this many characters or
 // more; the folder is then read as empty.
 inline constexpr size_t kMaxSearchPattern = 260;
+
+// The component folders a cycle visits by name when they exist, in this order,
+// after those found through marker files.
+inline constexpr std::array<const char16_t*, 4> kFixedComponentFolders = {
+    u"Activity Outside of Business Hours_Alert",
+    u"All Environment Changes",
+    u"Predefine Alerts",
+    u"Anomaly Alerts",
+};
 
 // Appends the name of every direct subfolder of `folder` that holds a marker
 // file ("info.dat", "info_SP.dat", "info_SS.dat", "<name>.dat", "info_FSA.dat").

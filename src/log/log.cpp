@@ -22,7 +22,7 @@ void WriteLog(const std::u16string& message) {
     }
     platform::Env& env = platform::Current();
     const std::u16string folder = platform::LogFolder();
-    if (!env.PathExists(folder)) return;
+    if (folder.empty() || !env.PathExists(folder)) return;
     const std::u16string path = folder + platform::NativeSeparators(u"\\ErrorLog.txt");
 
     std::u16string timestamp = env.TimestampText(env.LocalNow());

@@ -15,7 +15,11 @@ std::atomic<Env*> g_current{nullptr};
 // Leaked on purpose: a detached thread may read them while the process exits.
 std::u16string* g_log_folder = nullptr;
 std::u16string* g_settings_root = nullptr;
-std::mutex* g_locations_mutex = new std::mutex;
+// Made on first use, so a caller's static initializer may already use it.
+std::mutex& LocationsMutex() {
+  static std::mutex* mutex = new std::mutex;
+  return *mutex;
+}
 
 std::u16string& LogFolderSlot() {
   if (g_log_folder == nullptr) {
@@ -76,22 +80,22 @@ ScopedEnv::ScopedEnv(Env* env) : previous_(g_current.exchange(env)) {}
 ScopedEnv::~ScopedEnv() { g_current.store(previous_); }
 
 std::u16string LogFolder() {
-  std::lock_guard<std::mutex> lock(*g_locations_mutex);
+  std::lock_guard<std::mutex> lock(LocationsMutex());
   return LogFolderSlot();
 }
 
 void SetLogFolder(std::u16string folder) {
-  std::lock_guard<std::mutex> lock(*g_locations_mutex);
+  std::lock_guard<std::mutex> lock(LocationsMutex());
   LogFolderSlot() = std::move(folder);
 }
 
 std::u16string SettingsRoot() {
-  std::lock_guard<std::mutex> lock(*g_locations_mutex);
+  std::lock_guard<std::mutex> lock(LocationsMutex());
   return SettingsRootSlot();
 }
 
 void SetSettingsRoot(std::u16string folder) {
-  std::lock_guard<std::mutex> lock(*g_locations_mutex);
+  std::lock_guard<std::mutex> lock(LocationsMutex());
   SettingsRootSlot() = std::move(folder);
 }
 

@@ -152,6 +152,11 @@ class Env {
   // has it, or when the file cannot be opened (access denied counts as held).
   virtual FileLock TryLockFile(const std::u16string& path);
   virtual void UnlockFile(FileLock lock);
+  // Whether another holder has the lock that TryLockFile takes, asked without
+  // waiting and without changing anything: an existing file is opened for
+  // reading, locked and released at once; a missing file is free and is not
+  // created. A file that cannot be opened counts as held, as in TryLockFile.
+  virtual bool FileLockHeld(const std::u16string& path);
 
   // --- Clocks and time zone ----------------------------------------------
   virtual SystemTime LocalNow();
@@ -200,6 +205,10 @@ class Env {
   virtual SettingsKey OpenKey(SettingsKey parent, const std::u16string& name);
   // RegCreateKeyExW (non-volatile, KEY_READ | KEY_WRITE): opens or creates.
   virtual SettingsKey CreateKey(SettingsKey parent, const std::u16string& name);
+  // RegOpenKeyExW with KEY_READ alone, so a process without write access to
+  // the key (an unelevated one) still reads it; never creates. Null when the
+  // key is missing or cannot be read.
+  virtual SettingsKey OpenKeyForReading(SettingsKey parent, const std::u16string& name);
   // The value's bytes read as UTF-16 text whatever its type, ending at its first
   // zero character. Empty when the value is missing or unreadable.
   virtual std::optional<std::u16string> QueryStringValue(SettingsKey key, const std::u16string& name);
@@ -243,7 +252,7 @@ class ScopedEnv {
 // the command-line tool point elsewhere. Set them before starting any thread.
 //
 // The diagnostic log folder: "C:\AlertSummaryDbg" on Windows,
-// "/var/log/AlertSummaryDbg" on Linux.
+// "/var/log/AlertSummaryDbg" on Linux. An empty folder switches the log off.
 std::u16string LogFolder();
 void SetLogFolder(std::u16string folder);
 // POSIX only: the folder that stands for HKEY_LOCAL_MACHINE (each key a folder,

@@ -38,4 +38,19 @@ std::u16string GetRetentionSetting(const std::u16string& name, const std::u16str
   return GetSettingString(name, name, default_value);
 }
 
+std::u16string ReadRetentionSetting(const std::u16string& name, const std::u16string& default_value) {
+  Env& env = platform::Current();
+  SettingsKey key = Env::LocalMachine();
+  for (const std::u16string& step : {std::u16string(u"software"), std::u16string(u"Varnholt Suite"),
+                                     std::u16string(u"Varnholt Suite"), name}) {
+    SettingsKey next = env.OpenKeyForReading(key, step);
+    env.CloseKey(key);
+    key = next;
+    if (key == nullptr) return default_value;
+  }
+  std::optional<std::u16string> value = env.QueryStringValue(key, name);
+  env.CloseKey(key);
+  return value ? *value : default_value;
+}
+
 }  // namespace asum

@@ -30,4 +30,9 @@ std::u16string GetSettingString(const std::u16string& setting_key, const std::u1
 // The setting's key and value carry the same name.
 std::u16string GetRetentionSetting(const std::u16string& name, const std::u16string& default_value);
 
+// The same setting for a reader that must change nothing (the support tool's
+// status): every key on the way is opened for reading alone and none is
+// created; a missing key or value gives the default.
+std::u16string ReadRetentionSetting(const std::u16string& name, const std::u16string& default_value);
+
 }  // namespace asum

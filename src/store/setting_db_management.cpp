@@ -30,10 +30,14 @@ std::u16string ExecuteQueryStatusLine(bool succeeded) {
 
 CSettingDBManagement::CSettingDBManagement(BusyBudget* budget) { db_.SetBusyBudget(budget); }
 
-std::u16string CSettingDBManagement::GetAlertSummaryFolder(const std::u16string& install_folder) {
+std::u16string CSettingDBManagement::AlertSummaryFolderPath(const std::u16string& install_folder) {
   std::u16string folder = install_folder;
   if (!folder.empty() && folder.back() != platform::kPathSeparator) folder += platform::kPathSeparator;
-  folder += u"Alert_Summary";
+  return folder + u"Alert_Summary";
+}
+
+std::u16string CSettingDBManagement::GetAlertSummaryFolder(const std::u16string& install_folder) {
+  const std::u16string folder = AlertSummaryFolderPath(install_folder);
   platform::Env& env = platform::Current();
   if (!env.PathExists(folder)) env.CreateFolder(folder);
   return folder;

@@ -36,6 +36,8 @@ class CSettingDBManagement {
   // "Alert_Summary"; the folder is created (one level) when missing, and a
   // failure to create it is ignored.
   static std::u16string GetAlertSummaryFolder(const std::u16string& install_folder);
+  // The same folder's path, for readers that must not create it.
+  static std::u16string AlertSummaryFolderPath(const std::u16string& install_folder);
   // The database file in a database folder: folder + "\AlertSummaryDB.db".
   static std::u16string DatabasePath(const std::u16string& summary_folder);
 

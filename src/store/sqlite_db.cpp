@@ -5,6 +5,8 @@
 #include <algorithm>
 #include <chrono>
 
+#include "common/utf.h"
+
 namespace asum {
 namespace {
 
@@ -45,6 +47,20 @@ bool CDbSQLite::Open(const std::u16string& path) {
   const int rc = sqlite3_open16(file.c_str(), &db);
   if (rc != SQLITE_OK) {
     // SQLite may hand back a connection even when the open failed; it is ours to release.
+    if (db != nullptr) sqlite3_close(db);
+    return false;
+  }
+  db_ = db;
+  sqlite3_busy_handler(db_, &CDbSQLite::OnBusy, this);
+  return true;
+}
+
+bool CDbSQLite::OpenReadOnly(const std::u16string& path) {
+  Close();
+  // The UTF-16 entry point knows no flags; SQLite takes UTF-8 names on every platform.
+  const std::string file = Utf16ToUtf8(UpToFirstNul(path));
+  sqlite3* db = nullptr;
+  if (sqlite3_open_v2(file.c_str(), &db, SQLITE_OPEN_READONLY, nullptr) != SQLITE_OK) {
     if (db != nullptr) sqlite3_close(db);
     return false;
   }

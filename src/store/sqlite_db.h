@@ -44,6 +44,9 @@ class CDbSQLite {
   // object still holds is closed first. On failure nothing stays open and the
   // result is false.
   bool Open(const std::u16string& path);
+  // Opens an existing file for reading only: a missing file is not created
+  // (false), and no statement on this connection can change the file.
+  bool OpenReadOnly(const std::u16string& path);
   // Closes the connection. Statements still alive are finalized first (their
   // objects stay valid and fail from then on). Always true.
   bool Close();

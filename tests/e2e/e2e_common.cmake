@@ -5,6 +5,16 @@
 # e2e_log_lines(<var>)        the log's messages, timestamps cut off
 # e2e_log_end()               switches the log off again when we switched it on
 # e2e_host(<out> <rc> args…)  runs the host with the steps given
+# tool(<out> <rc> args…)      runs the support tool; its stderr lands in tool_stderr
+# expect_tool(<rc> <regex> args…)  fails unless the tool exits so and its output matches
+# expect_usage(args…)         fails unless the tool refuses with exit 2, one stderr line, no output
+# tool_lock_held(<out> <rc> <lock file> args…)  runs the tool while another process holds the collector lock
+# expect_json(<json> <expected> <key>… [LENGTH])  fails unless the value (or length) at the keys is as expected
+#                             (booleans read ON/OFF, null reads "")
+# set_retention(<enabled> <days text>)   the retention settings the tool reads (--settings-root on Linux)
+# clear_retention()           removes them again
+# e2e_need(<var> <program> <why>)  skips the test, with one line, when the program is missing
+# sqlite(<out> <db> <sql>)    runs statements with the sqlite3 program (found by e2e_need(SQLITE3 sqlite3 …))
 
 if(WINDOWS)
   if(DEFINED ENV{WINEPREFIX})
@@ -146,4 +156,117 @@ function(e2e_expect_all_marked dir)
   if(left)
     e2e_fail("files left unprocessed: ${left}")
   endif()
+endfunction()
+
+function(tool out rc)
+  execute_process(COMMAND ${EMULATOR} "${TOOL}" ${ARGN} OUTPUT_VARIABLE o ERROR_VARIABLE e RESULT_VARIABLE r TIMEOUT 100)
+  set(${out} "${o}" PARENT_SCOPE)
+  set(${rc} "${r}" PARENT_SCOPE)
+  set(tool_stderr "${e}" PARENT_SCOPE)
+endfunction()
+
+function(expect_tool expected_rc expected_regex)
+  tool(out rc ${ARGN})
+  if(NOT rc EQUAL expected_rc OR NOT out MATCHES "${expected_regex}")
+    e2e_fail("alertsummary ${ARGN}: exit ${rc}, output:\n${out}${tool_stderr}\nexpected exit ${expected_rc} and /${expected_regex}/")
+  endif()
+  set(tool_out "${out}" PARENT_SCOPE)
+  set(tool_stderr "${tool_stderr}" PARENT_SCOPE)
+endfunction()
+
+function(expect_usage)
+  tool(out rc ${ARGN})
+  string(REGEX MATCHALL "\n" newlines "${tool_stderr}")
+  list(LENGTH newlines lines)
+  if(NOT rc EQUAL 2 OR NOT out STREQUAL "" OR NOT lines EQUAL 1 OR NOT tool_stderr MATCHES "^alertsummary: ")
+    e2e_fail("alertsummary ${ARGN}: exit ${rc}, stdout '${out}', stderr '${tool_stderr}'; expected exit 2 and one line")
+  endif()
+endfunction()
+
+# The tool's collector lock is flock on Linux and LockFileEx under Wine, which
+# Wine keeps as a POSIX record lock: hold each the way the other side sees it.
+function(tool_lock_held out rc lock)
+  if(WINDOWS)
+    file(LOCK "${lock}" GUARD FUNCTION TIMEOUT 10)
+    tool(o r ${ARGN})
+  else()
+    find_program(FLOCK flock REQUIRED)
+    execute_process(COMMAND ${FLOCK} --nonblock "${lock}" "${TOOL}" ${ARGN}
+      OUTPUT_VARIABLE o ERROR_VARIABLE tool_stderr RESULT_VARIABLE r TIMEOUT 100)
+  endif()
+  set(${out} "${o}" PARENT_SCOPE)
+  set(${rc} "${r}" PARENT_SCOPE)
+  set(tool_stderr "${tool_stderr}" PARENT_SCOPE)
+endfunction()
+
+function(expect_json json expected)
+  set(keys ${ARGN})
+  list(GET keys -1 last)
+  if(last STREQUAL "LENGTH")
+    list(POP_BACK keys)
+    string(JSON got ERROR_VARIABLE error LENGTH "${json}" ${keys})
+  else()
+    string(JSON got ERROR_VARIABLE error GET "${json}" ${keys})
+  endif()
+  if(NOT "${got}" STREQUAL "${expected}")
+    e2e_fail("JSON ${ARGN}: '${got}' ${error}, expected '${expected}' in\n${json}")
+  endif()
+endfunction()
+
+set(E2E_SETTINGS "${WORK}/${CASE}.settings")
+set(E2E_SUITE_KEY "HKLM\\software\\Varnholt Suite\\Varnholt Suite")
+function(set_retention enabled days)
+  foreach(pair "Sch_Retention;${enabled}" "Sch_Retention_Val;${days}")
+    list(GET pair 0 name)
+    list(GET pair 1 value)
+    if(WINDOWS)
+      execute_process(COMMAND ${EMULATOR} reg add "${E2E_SUITE_KEY}\\${name}" /v ${name} /d "${value}" /f
+        OUTPUT_QUIET ERROR_QUIET RESULT_VARIABLE r)
+    else()
+      file(WRITE "${E2E_SETTINGS}/software/Varnholt Suite/Varnholt Suite/${name}/${name}" "${value}")
+    endif()
+  endforeach()
+endfunction()
+
+function(clear_retention)
+  file(REMOVE_RECURSE "${E2E_SETTINGS}")
+  file(MAKE_DIRECTORY "${E2E_SETTINGS}")
+  if(WINDOWS)
+    foreach(name Sch_Retention Sch_Retention_Val)
+      execute_process(COMMAND ${EMULATOR} reg delete "${E2E_SUITE_KEY}\\${name}" /f OUTPUT_QUIET ERROR_QUIET)
+    endforeach()
+  endif()
+endfunction()
+
+# At the top level of a script: skips the test when a program it needs is missing.
+macro(e2e_need var program why)
+  find_program(${var} ${program})
+  if(NOT ${var})
+    message(STATUS "SKIPPED: no ${program} on this machine; ${why}")
+    if(CMAKE_VERSION VERSION_GREATER_EQUAL 3.29)
+      cmake_language(EXIT 77)  # ctest's SKIP_RETURN_CODE; older CMake skips by the line above
+    endif()
+    return()
+  endif()
+endmacro()
+
+function(sqlite out db sql)
+  execute_process(COMMAND ${SQLITE3} "${db}" "${sql}" OUTPUT_VARIABLE o ERROR_VARIABLE e RESULT_VARIABLE r
+    OUTPUT_STRIP_TRAILING_WHITESPACE)
+  if(NOT r EQUAL 0)
+    e2e_fail("sqlite3 ${sql}: ${e}")
+  endif()
+  set(${out} "${o}" PARENT_SCOPE)
+endfunction()
+
+# Days since 1970-01-01 of a date of the Gregorian calendar.
+function(days_from_civil out y m d)
+  if(m LESS_EQUAL 2)
+    math(EXPR y "${y} - 1")
+  endif()
+  math(EXPR era "${y} / 400")
+  math(EXPR yoe "${y} - ${era} * 400")
+  math(EXPR doy "(153 * ((${m} + 9) % 12) + 2) / 5 + ${d} - 1")
+  math(EXPR days "${era} * 146097 + ${yoe} * 365 + ${yoe} / 4 - ${yoe} / 100 + ${doy} - 719468")
+  set(${out} ${days} PARENT_SCOPE)
 endfunction()

@@ -34,12 +34,19 @@ TEST(PlatformFiles, MoveNeverReplacesReadRefusesFoldersAndTheLockIsExclusive) {
   EXPECT_EQ(env.ReadFile(b, &bytes, 0).status, FileStatus::kTooLarge);
   EXPECT_EQ(env.ReadFile(dir.Join(u"missing"), &bytes, 10).status, FileStatus::kNotFound);
 
-  platform::FileLock first = env.TryLockFile(dir.Join(u"x.lock"));
+  // The probe of the support tool's status sees a holder, takes nothing and
+  // creates no lock file.
+  const std::u16string lock = dir.Join(u"x.lock");
+  EXPECT_FALSE(env.FileLockHeld(lock));
+  EXPECT_FALSE(env.PathExists(lock));
+  platform::FileLock first = env.TryLockFile(lock);
   ASSERT_NE(first, nullptr);
-  EXPECT_EQ(env.TryLockFile(dir.Join(u"x.lock")), nullptr);
+  EXPECT_EQ(env.TryLockFile(lock), nullptr);
+  EXPECT_TRUE(env.FileLockHeld(lock));
   env.UnlockFile(first);
-  first = env.TryLockFile(dir.Join(u"x.lock"));
-  EXPECT_NE(first, nullptr);
+  EXPECT_FALSE(env.FileLockHeld(lock));
+  first = env.TryLockFile(lock);
+  EXPECT_NE(first, nullptr) << "neither the probe nor the unlock left it taken";
   env.UnlockFile(first);
 }
 

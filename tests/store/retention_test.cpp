@@ -2,6 +2,7 @@
 
 #include "store/alert_count.h"
 #include "store/host_queries.h"
+#include "store/retention_settings.h"
 #include "store_test_support.h"
 
 namespace asum {
@@ -88,6 +89,21 @@ TEST_F(RetentionTest, OnlyExactlyTrueSwitchesItOn) {
   EXPECT_EQ(RunRetentionProc(dir_.install()), 0);
   EXPECT_TRUE(env_.keys.empty());
   EXPECT_EQ(dir_.Column().size(), kWhens.size());
+}
+
+// The support tool's status reads the settings where a person may only read:
+// it finds what the purge finds, and creates no key on the way.
+TEST_F(RetentionTest, ReadingForStatusCreatesNoKey) {
+  const std::u16string key = u"software\\Varnholt Suite\\Varnholt Suite\\Sch_Retention_Val";
+  for (const char16_t* value : {u"30 Days", u"", static_cast<const char16_t*>(nullptr)}) {
+    env_.SetSetting(u"Sch_Retention_Val", value);
+    if (value == nullptr) env_.keys.erase(key);
+    const std::u16string read = value ? value : u"15 Days";
+    EXPECT_EQ(ReadRetentionSetting(u"Sch_Retention_Val", u"15 Days"), read);
+    EXPECT_EQ(env_.keys.count(key), value ? 1u : 0u) << "reading creates no key";
+    EXPECT_EQ(GetRetentionSetting(u"Sch_Retention_Val", u"15 Days"), read);
+  }
+  EXPECT_EQ(env_.open_keys, 0);
 }
 
 TEST_F(RetentionTest, UnusableDatabasesGiveZeroAndKeepTheirRows) {

@@ -57,7 +57,7 @@ class UnwritableFile {
 
 // Today is 2024-03-20 13:45; the settings are a registry in memory whose keys
 // are paths below HKEY_LOCAL_MACHINE ("software\Varnholt Suite"), a value at
-// its key's path, "\" and its name.
+// its key's path, "\" and its name. SetSetting makes the keys on the way.
 class StoreEnv : public platform::Env {
  public:
   std::u16string executable;
@@ -67,7 +67,9 @@ class StoreEnv : public platform::Env {
 
   // Where the host writes a retention setting; null removes it.
   void SetSetting(const std::u16string& name, const char16_t* value) {
-    const std::u16string path = u"software\\Varnholt Suite\\Varnholt Suite\\" + name + u"\\" + name;
+    const std::u16string suite = u"software\\Varnholt Suite\\Varnholt Suite";
+    keys.insert({u"software", u"software\\Varnholt Suite", suite, suite + u"\\" + name});
+    const std::u16string path = suite + u"\\" + name + u"\\" + name;
     value ? void(values[path] = value) : void(values.erase(path));
   }
   platform::SystemTime LocalNow() override { return {2024, 3, 3, 20, 13, 45, 0, 0}; }
@@ -79,6 +81,7 @@ class StoreEnv : public platform::Env {
   Key OpenKey(Key parent, const std::u16string& name) override {
     return keys.count(Path(parent, name)) ? CreateKey(parent, name) : nullptr;
   }
+  Key OpenKeyForReading(Key parent, const std::u16string& name) override { return OpenKey(parent, name); }
   Key CreateKey(Key parent, const std::u16string& name) override {
     return ++open_keys, new std::u16string(*keys.insert(Path(parent, name)).first);
   }
@@ -86,7 +89,9 @@ class StoreEnv : public platform::Env {
     const auto found = values.find(Path(key, name));
     return found == values.end() ? std::nullopt : std::optional(found->second);
   }
-  void CloseKey(Key key) override { --open_keys, delete static_cast<std::u16string*>(key); }
+  void CloseKey(Key key) override {
+    if (key != LocalMachine()) --open_keys, delete static_cast<std::u16string*>(key);
+  }
 };
 
 }  // namespace asum::test

@@ -15,21 +15,16 @@ namespace fs = std::filesystem;
 namespace asum::test {
 namespace {
 
+// Test programs never write into the service's own log folder: the
+// end-to-end tests switch it on and read it, and a cycle run by a test program
+// beside them would add its lines. A test that reads the log captures it.
+const bool kServiceLogOff = [] {
+  platform::SetLogFolder(u"");
+  return true;
+}();
+
 fs::path ToPath(const std::u16string& p) { return fs::path(p); }
 std::u16string FromPath(const fs::path& p) { return p.u16string(); }
-
-// No test program writes the machine's diagnostic log, which a test of the
-// whole library may have switched on: until a test captures the log, it goes
-// to a folder that does not exist.
-class NoMachineLog : public ::testing::Environment {
- public:
-  void SetUp() override { platform::SetLogFolder(missing_.Join(u"missing")); }
-
- private:
-  TempDir missing_;
-};
-[[maybe_unused]] ::testing::Environment* const g_no_machine_log =
-    ::testing::AddGlobalTestEnvironment(new NoMachineLog);
 
 }  // namespace
 

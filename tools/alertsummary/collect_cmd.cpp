@@ -6,6 +6,7 @@
 #include "collect/process_alerts.h"
 #include "commands.h"
 #include "platform/platform.h"
+#include "progress.h"
 
 namespace asum::tool {
 namespace {
@@ -14,28 +15,6 @@ struct CollectOptions {
   CommonOptions common;
   bool once = false;
   double interval = 10;
-};
-
-// A bar on stderr while a long backlog is worked through; only on a terminal,
-// so piped output stays clean.
-class Progress {
- public:
-  explicit Progress(uint64_t total) : total_(total), enabled_(total > 0 && platform::StderrIsTerminal()) {}
-  void Advance(uint64_t done) {
-    if (!enabled_) return;
-    const int width = 40;
-    const int filled = static_cast<int>(width * done / total_);
-    std::fprintf(stderr, "\r[%.*s%*s] %llu/%llu files", filled, "########################################",
-                 width - filled, "", static_cast<unsigned long long>(done), static_cast<unsigned long long>(total_));
-    std::fflush(stderr);
-  }
-  ~Progress() {
-    if (enabled_) std::fprintf(stderr, "\n");
-  }
-
- private:
-  uint64_t total_;
-  bool enabled_;
 };
 
 uint64_t Backlog(const std::u16string& install) {
@@ -83,11 +62,7 @@ Runner AddCollect(CLI::App& app) {
                        ->check(CLI::PositiveNumber);
   once->excludes(interval);
   return [options]() {
-    const std::u16string install = ApplyCommonOptions(options->common);
-    if (!platform::Current().PathExists(install)) {
-      std::fprintf(stderr, "alertsummary: install folder %s does not exist\n", Utf8(install).c_str());
-      return kExitFailure;
-    }
+    const std::u16string install = ApplyCommonOptions(options->common, ServiceLog::kWrite);
     if (options->once) return RunOnce(install, true);
     const auto pause = static_cast<uint32_t>(options->interval * 1000);
     platform::StopSignal never;  // the tool runs until it is killed, as the service's thread does

@@ -1,11 +1,11 @@
 #include <cstdio>
 #include <memory>
 
-#include "collect/cycle.h"
 #include "commands.h"
-#include "platform/platform.h"
+#include "common/wide_number.h"
+#include "input_checks.h"
+#include "install_view.h"
 #include "store/alert_count.h"
-#include "store/database_probe.h"
 
 namespace asum::tool {
 namespace {
@@ -28,17 +28,24 @@ Runner AddCount(CLI::App& app) {
                   "Alert Action (text holding \"Email Alert\" or \"Script Alert\") or Alert Type to match, LIKE %TEXT%");
   auto* from = sub->add_option("--from", options->from, "Lower bound of \"When\", \"YYYY/MM/DD hh:mm:ss\" (inclusive)");
   auto* to = sub->add_option("--to", options->to, "Upper bound of \"When\", \"YYYY/MM/DD hh:mm:ss\" (inclusive)");
-  auto* range = sub->add_option("--range", options->range, "The raw range text as the host passes it");
+  auto* range = sub->add_option("--range", options->range,
+                                "The raw range text as the host passes it, taken as it stands");
   range->excludes(from)->excludes(to);
-  return [options, range]() {
-    const std::u16string install = ApplyCommonOptions(options->common);
-    const std::u16string db_path = DatabasePathOf(install);
-    if (platform::Current().PathExists(db_path) && !IsDatabaseFile(db_path)) {
-      std::fprintf(stderr, "alertsummary: %s is not an alert database\n", Utf8(db_path).c_str());
-      return kExitFailure;
-    }
+  return [options, from, to, range]() {
+    const std::u16string install = ApplyCommonOptions(options->common, ServiceLog::kLeaveAlone);
+    CheckPeriod(from, options->from, to, options->to);
+    BusyBudget budget(kQueryBusyTimeoutMs);
+    CDbSQLite db;
+    db.SetBusyBudget(&budget);
+    OpenForReading(db, PathsOf(install).database);
+    // The library's own statement, on a connection that cannot change the file.
     const std::u16string range_text = range->count() > 0 ? Utf16(options->range) : RangeText(options->from, options->to);
-    std::printf("%d\n", CountAlerts(install, Utf16(options->filter), range_text));
+    const CountStatement count = BuildCountStatement(Utf16(options->filter), range_text);
+    std::unique_ptr<CSqlStatement> statement = db.Statement(count.sql);
+    for (size_t i = 0; i < count.params.size(); ++i) statement->BindText(static_cast<int>(i + 1), count.params[i]);
+    // Every failure counts 0, as the export answers.
+    const int32_t result = statement->NextRow() ? WcstolBase10(statement->ValueString(0)) : 0;
+    std::printf("%d\n", result);
     return kExitOk;
   };
 }

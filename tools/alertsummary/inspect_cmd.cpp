@@ -55,7 +55,7 @@ nlohmann::ordered_json RowJson(const AlertRow& r) {
 Runner AddInspect(CLI::App& app) {
   auto* sub = app.add_subcommand("inspect",
                                  "Show what would be stored for alert files, touching neither the files nor the database "
-                                 "(one JSON object per line)");
+                                 "(one JSON object per line; exit 1 when a file cannot be read)");
   auto options = std::make_shared<InspectOptions>();
   AddCommonOptions(*sub, options->common, false);
   sub->add_option("files", options->files, "Alert files (.eml)")->required();
@@ -64,7 +64,8 @@ Runner AddInspect(CLI::App& app) {
   sub->add_option("--status", options->status, "Delivered or Failed (default: after the report folder)")
       ->check(CLI::IsMember({"Delivered", "Failed"}));
   return [options]() {
-    ApplyCommonOptions(options->common);
+    ApplyCommonOptions(options->common, ServiceLog::kLeaveAlone);
+    int code = kExitOk;
     for (const std::string& name : options->files) {
       const fs::path file = fs::absolute(fs::path(name)).lexically_normal();
       std::string component = options->component, status = options->status;
@@ -73,6 +74,7 @@ Runner AddInspect(CLI::App& app) {
       nlohmann::ordered_json out;
       out["file"] = Utf8(PathText(file));
       out["loaded"] = a.loaded;
+      if (!a.loaded) code = kExitFailure;
       if (a.loaded) {
         out["sender"] = Utf8(a.sender);
         out["subject"] = Utf8(a.subject);
@@ -83,7 +85,7 @@ Runner AddInspect(CLI::App& app) {
       if (a.outcome == AlertOutcome::kStore) out["row"] = RowJson(a.row);
       std::printf("%s\n", out.dump(-1, ' ', false, nlohmann::json::error_handler_t::replace).c_str());
     }
-    return kExitOk;
+    return code;
   };
 }
 

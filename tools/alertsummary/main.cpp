@@ -3,12 +3,19 @@
 // install folder given with --install-dir (default: the current folder).
 #include <cstdio>
 #include <filesystem>
+#include <utility>
+#include <vector>
 
 #include "commands.h"
 #include "common/utf.h"
 #include "platform/platform.h"
 
 namespace asum::tool {
+namespace {
+
+std::u16string g_service_log_folder;
+
+}  // namespace
 
 std::string Utf8(const std::u16string& text) { return Utf16ToUtf8(DisplayText(text)); }
 std::u16string Utf16(const std::string& text) { return Utf8ToUtf16(text); }
@@ -34,14 +41,24 @@ void AddCommonOptions(CLI::App& sub, CommonOptions& options, bool with_install_d
                  "Linux: the folder standing for HKEY_LOCAL_MACHINE in the settings tree");
 }
 
-std::u16string ApplyCommonOptions(const CommonOptions& options) {
+std::u16string ServiceLogFolder() { return g_service_log_folder; }
+
+std::u16string ApplyCommonOptions(const CommonOptions& options, ServiceLog log) {
   namespace fs = std::filesystem;
-  if (!options.log_dir.empty()) platform::SetLogFolder(PathText(fs::absolute(fs::path(options.log_dir))));
+  if (!options.log_dir.empty()) {
+    platform::SetLogFolder(PathText(fs::absolute(fs::path(options.log_dir))));
+  } else if (log == ServiceLog::kLeaveAlone) {
+    platform::SetLogFolder(u"");
+  }
   if (!options.settings_root.empty()) {
     platform::SetSettingsRoot(PathText(fs::absolute(fs::path(options.settings_root))));
   }
   std::u16string install = PathText(fs::absolute(fs::path(options.install_dir)).lexically_normal());
   while (install.size() > 1 && install.back() == platform::kPathSeparator) install.pop_back();
+  std::error_code error;
+  if (!fs::is_directory(fs::absolute(fs::path(options.install_dir)), error)) {
+    throw ToolError(kExitUsage, "install folder " + Utf8(install) + " does not exist");
+  }
   return install;
 }
 
@@ -49,25 +66,36 @@ std::u16string ApplyCommonOptions(const CommonOptions& options) {
 
 int main(int argc, char** argv) {
   using namespace asum::tool;
+  g_service_log_folder = asum::platform::LogFolder();
   CLI::App app{"Summarises the alert e-mails an alerting service saved: collects them into the alert database, "
-               "inspects single files, counts, reports and purges stored alerts."};
+               "inspects single files, counts, reports, checks and purges stored alerts."};
   app.require_subcommand(1);
   // Paths such as /srv/x must never read as Windows-style options.
   app.allow_windows_style_options(false);
   app.set_help_all_flag("--help-all", "Help for every subcommand");
-  Runner runners[] = {AddCollect(app), AddInspect(app), AddCount(app), AddReport(app), AddPurge(app)};
+  using Adder = Runner (*)(CLI::App&);
+  std::vector<std::pair<CLI::App*, Runner>> subcommands;
+  for (Adder add : {AddCollect, AddInspect, AddCount, AddReport, AddPurge, AddStatus, AddAudit, AddOptimize}) {
+    Runner runner = add(app);
+    const auto all = app.get_subcommands(std::function<bool(CLI::App*)>());
+    subcommands.emplace_back(all.back(), std::move(runner));
+  }
   try {
     app.parse(argc, argv);
   } catch (const CLI::ParseError& e) {
-    const int code = app.exit(e);
-    return code == 0 ? kExitOk : kExitUsage;
+    if (e.get_exit_code() == 0) return app.exit(e);
+    // One line naming the problem, for people and for scripts alike.
+    std::fprintf(stderr, "alertsummary: %s\n", e.what());
+    return kExitUsage;
   }
-  const auto chosen = app.get_subcommands().front()->get_name();
-  const char* names[] = {"collect", "inspect", "count", "report", "purge"};
+  CLI::App* chosen = app.get_subcommands().front();
   try {
-    for (int i = 0; i < 5; ++i) {
-      if (chosen == names[i]) return runners[i]();
+    for (auto& [sub, runner] : subcommands) {
+      if (sub == chosen) return runner();
     }
+  } catch (const ToolError& e) {
+    std::fprintf(stderr, "alertsummary: %s\n", e.what());
+    return e.code();
   } catch (const std::exception& e) {
     std::fprintf(stderr, "alertsummary: %s\n", e.what());
     return kExitFailure;

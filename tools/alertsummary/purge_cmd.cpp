@@ -13,7 +13,7 @@ Runner AddPurge(CLI::App& app) {
   auto options = std::make_shared<CommonOptions>();
   AddCommonOptions(*sub, *options);
   return [options]() {
-    const std::u16string install = ApplyCommonOptions(*options);
+    const std::u16string install = ApplyCommonOptions(*options, ServiceLog::kWrite);
     const std::u16string enabled = GetRetentionSetting(u"Sch_Retention", u"FALSE");
     if (enabled != u"TRUE") {
       std::printf("retention is off (Sch_Retention is \"%s\"); nothing deleted\n", Utf8(enabled).c_str());

@@ -5,6 +5,7 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <cerrno>
 #include <cstring>
 
 #include "platform/posix/posix_util.h"
@@ -260,6 +261,15 @@ void Env::UnlockFile(FileLock lock) {
   int* fd = static_cast<int*>(lock);
   ::close(*fd);  // releases the lock
   delete fd;
+}
+
+bool Env::FileLockHeld(const std::u16string& path) {
+  const int fd = ::open(ToNative(path).c_str(), O_RDONLY | O_NOFOLLOW | O_CLOEXEC);
+  if (fd < 0) return errno != ENOENT;
+  // flock needs no write access; closing the descriptor releases it.
+  const bool held = ::flock(fd, LOCK_EX | LOCK_NB) != 0;
+  ::close(fd);
+  return held;
 }
 
 }  // namespace asum::platform

@@ -49,6 +49,13 @@ SettingsKey Env::OpenKey(SettingsKey parent, const std::u16string& name) {
   return new KeyFolder{path};
 }
 
+SettingsKey Env::OpenKeyForReading(SettingsKey parent, const std::u16string& name) {
+  if (parent == nullptr || !ValidName(name)) return nullptr;
+  const std::string path = FolderOf(parent) + "/" + posix::ToNative(name);
+  if (!IsFolder(path) || ::access(path.c_str(), R_OK | X_OK) != 0) return nullptr;
+  return new KeyFolder{path};
+}
+
 SettingsKey Env::CreateKey(SettingsKey parent, const std::u16string& name) {
   if (parent == nullptr || !ValidName(name)) return nullptr;
   const std::string path = FolderOf(parent) + "/" + posix::ToNative(name);

@@ -179,4 +179,22 @@ void Env::UnlockFile(FileLock lock) {
   ::CloseHandle(static_cast<HANDLE>(lock));
 }
 
+bool Env::FileLockHeld(const std::u16string& path) {
+  // Read access is enough for LockFileEx, and OPEN_EXISTING never creates.
+  HANDLE file = ::CreateFileW(W(path), GENERIC_READ, FILE_SHARE_READ | FILE_SHARE_WRITE | FILE_SHARE_DELETE, nullptr,
+                              OPEN_EXISTING, FILE_ATTRIBUTE_NORMAL, nullptr);
+  if (file == INVALID_HANDLE_VALUE) {
+    const DWORD error = ::GetLastError();
+    return error != ERROR_FILE_NOT_FOUND && error != ERROR_PATH_NOT_FOUND;
+  }
+  OVERLAPPED at = {};
+  const bool held = !::LockFileEx(file, LOCKFILE_EXCLUSIVE_LOCK | LOCKFILE_FAIL_IMMEDIATELY, 0, 1, 0, &at);
+  if (!held) {
+    OVERLAPPED again = {};
+    ::UnlockFileEx(file, 0, 1, 0, &again);
+  }
+  ::CloseHandle(file);
+  return held;
+}
+
 }  // namespace asum::platform

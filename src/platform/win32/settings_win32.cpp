@@ -18,6 +18,13 @@ SettingsKey Env::OpenKey(SettingsKey parent, const std::u16string& name) {
   return key;
 }
 
+SettingsKey Env::OpenKeyForReading(SettingsKey parent, const std::u16string& name) {
+  if (parent == nullptr) return nullptr;
+  HKEY key = nullptr;
+  if (::RegOpenKeyExW(static_cast<HKEY>(parent), W(name), 0, KEY_READ, &key) != ERROR_SUCCESS) return nullptr;
+  return key;
+}
+
 SettingsKey Env::CreateKey(SettingsKey parent, const std::u16string& name) {
   if (parent == nullptr) return nullptr;
   HKEY key = nullptr;
