@@ -40,7 +40,7 @@ arguments() {
     esac
   else
     case "$1" in
-      bench_collect_ingest) echo 2000 3 0 ;;
+      bench_collect_ingest) echo 2000 3 1 ;;
       bench_collect_idle) echo 100000 5 ;;
     esac
   fi

@@ -16,7 +16,8 @@ struct AlertMessage {
 };
 
 // False when the file cannot be loaded (missing, unreadable, still held by its
-// writer, too large); `message` is then untouched.
+// writer, too large); `message` is then untouched. A file still held by its
+// writer and one larger than the reader takes get a log line each time.
 bool LoadAlertMessage(const std::u16string& path, AlertMessage* message);
 
 }  // namespace asum

@@ -73,7 +73,9 @@ std::u16string InstallFolderOf(const std::u16string& executable_path) {
   return cut == std::u16string::npos ? std::u16string() : executable_path.substr(0, cut);
 }
 
-void RunCollectionCycle(const std::u16string& install_folder, const AlertFileProcessor& process) {
+void RunCollectionCycle(const std::u16string& install_folder, const AlertFileProcessor& process,
+                        const platform::StopSignal* stop) {
+  const auto stopped = [stop] { return stop != nullptr && stop->Requested(); };
   platform::Env& env = platform::Current();
   StringList components;
   GetComponentFolders(install_folder, components);
@@ -93,8 +95,10 @@ void RunCollectionCycle(const std::u16string& install_folder, const AlertFilePro
     const std::u16string component = install_folder + platform::kPathSeparator + name;
     if (!env.PathExists(component + NativeSeparators(u"\\AlertReports"))) continue;
     const std::u16string sent = component + NativeSeparators(u"\\AlertReports\\Sent items");
+    if (stopped()) return;
     if (env.PathExists(sent)) WalkReportFolder(sent, u"Delivered", name, files, process);
     const std::u16string outbox = component + NativeSeparators(u"\\AlertReports\\Outbox");
+    if (stopped()) return;
     if (env.PathExists(outbox)) WalkReportFolder(outbox, u"Failed", name, files, process);
   }
 }

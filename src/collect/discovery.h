@@ -12,6 +12,10 @@
 #include <string>
 #include <vector>
 
+namespace asum::platform {
+class StopSignal;
+}
+
 namespace asum {
 
 using StringList = std::vector<std::u16string>;
@@ -46,7 +50,9 @@ std::u16string InstallFolderOf(const std::u16string& executable_path);
 using AlertFileProcessor =
     std::function<void(StringList& files, const std::u16string& status, const std::u16string& component)>;
 
-// One collection cycle over `install_folder`.
-void RunCollectionCycle(const std::u16string& install_folder, const AlertFileProcessor& process);
+// One collection cycle over `install_folder`. A stop request (when given) is
+// looked at before each report folder: no folder is listed after it.
+void RunCollectionCycle(const std::u16string& install_folder, const AlertFileProcessor& process,
+                        const platform::StopSignal* stop = nullptr);
 
 }  // namespace asum

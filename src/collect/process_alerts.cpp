@@ -2,7 +2,6 @@
 
 #include <condition_variable>
 #include <mutex>
-#include <thread>
 
 #include "collect/alert_message.h"
 #include "common/utf.h"
@@ -37,15 +36,15 @@ std::u16string ScriptAlertWho(const std::u16string& body) {
 
 enum class MarkResult { kRenamed, kDeleted, kFailed };
 
-// Gives a file its PROC_ name, or deletes it when that name is taken.
+// Gives a file its PROC_ name, or deletes it when that name is taken. The
+// rename refuses a taken name, so it is tried first: the existence test is
+// needed only when it fails (a folder of that name may give another error).
 MarkResult MarkProcessed(const std::u16string& path, platform::FileResult* failure) {
   platform::Env& env = platform::Current();
   const std::u16string target = ProcName(path);
-  if (!env.PathExists(target)) {
-    *failure = env.RenameNoReplace(path, target);
-    if (failure->ok()) return MarkResult::kRenamed;
-    if (failure->status != platform::FileStatus::kAlreadyExists) return MarkResult::kFailed;
-  }
+  *failure = env.RenameNoReplace(path, target);
+  if (failure->ok()) return MarkResult::kRenamed;
+  if (failure->status != platform::FileStatus::kAlreadyExists && !env.PathExists(target)) return MarkResult::kFailed;
   *failure = env.RemoveFile(path);
   return failure->ok() ? MarkResult::kDeleted : MarkResult::kFailed;
 }
@@ -54,99 +53,148 @@ void LogMarkFailure(const std::u16string& path, const platform::FileResult& fail
   WriteLog(path + u" could not be renamed to its PROC_ name: " + failure.Describe());
 }
 
-// Reads and classifies the next file on a helper thread while the current one
+// A stored file that could not be marked keeps its name and comes back next
+// cycle, so its row goes: otherwise every cycle would store the alert once
+// more. A file that is gone (removed after it was read) never comes back, and
+// its row is all that is left of the alert: that row stays. True when the row
+// stays.
+bool KeepRowOfUnmarkedFile(CSettingDBManagement& store, int64_t row_id, const std::u16string& path) {
+  if (!platform::Current().PathExists(path)) {
+    WriteLog(path + u" is gone; the row stored for it stays");
+    return true;
+  }
+  if (row_id > 0 && store.ExecuteQuery(u"DELETE FROM AlertDB WHERE rowid = ?1", {DecimalText(row_id)})) {
+    WriteLog(u"Removed the row stored for " + path + u"; it is stored again when the file is processed");
+  } else {
+    WriteLog(u"Could not remove the row stored for " + path);
+  }
+  return false;
+}
+
+// Reads and classifies the next files on a helper thread while the current one
 // is stored: the commit waits on the disk and the analysis on a processor, so
-// with two cores a cycle runs at nearly the pace of its commits. The helper's
-// log lines are held back and written when its file's turn comes, so the log
-// reads exactly as if one thread had done everything.
-class AnalysisPipeline {
+// with two cores a cycle runs at nearly the pace of its commits. The helper
+// keeps a few files ahead, so that one slow file, or a moment in which a busy
+// machine gives it no processor, does not hold up the commits.
+//
+// Only while the log is off. The log wants each line written as it happens,
+// on the processing thread, so that the last file it names is the one in
+// hand should reading a file bring the process down. So the helper writes
+// nothing, and a file it analysed while the log was switched on is analysed
+// again here; while the log is on, no file is analysed ahead.
+class LookAhead {
  public:
-  AnalysisPipeline(const StringList& files, const std::u16string& status, const std::u16string& component)
-      : files_(files), status_(status), component_(component) {
-    try {
-      worker_ = std::thread([this] { Work(); });
-    } catch (...) {
-      // No thread to be had: every file is analysed in turn on the caller's.
-    }
-  }
+  LookAhead(const StringList& files, const std::u16string& status, const std::u16string& component,
+            const CycleContext& cycle)
+      : files_(files), status_(status), component_(component), cycle_(cycle) {}
 
-  ~AnalysisPipeline() {
-    {
-      std::lock_guard<std::mutex> lock(mutex_);
-      closing_ = true;
-    }
+  // Waits for the helper's file in hand (the stop request keeps it from
+  // starting another).
+  ~LookAhead() {
+    if (thread_ == nullptr) return;
+    std::unique_lock<std::mutex> lock(mutex_);
+    closing_ = true;
     changed_.notify_all();
-    if (worker_.joinable()) worker_.join();
+    changed_.wait(lock, [&] { return finished_; });
+    lock.unlock();
+    // It has left everything of ours; the join only releases the thread.
+    platform::Current().JoinThread(thread_, kJoinMs);
   }
 
-  // The analysis of files[index], taken in order 0, 1, 2, ...; its held-back
-  // log lines are written first. False when it failed (out of memory).
-  bool Next(size_t index, AlertAnalysis* out) {
+  // The analysis of files[index], taken in order 0, 1, 2, ... False when it
+  // failed (out of memory).
+  bool Take(size_t index, AlertAnalysis* out) {
+    const bool log_on = LogEnabled();
+    const bool ahead = !log_on && !cycle_.StopRequested();
     Result result;
-    if (worker_.joinable()) {
+    if (thread_ != nullptr) {
       std::unique_lock<std::mutex> lock(mutex_);
-      changed_.wait(lock, [&] { return ready_; });
-      result = std::move(slot_);
-      ready_ = false;
-      wanted_ = index + 1;
+      if (!log_on) changed_.wait(lock, [&] { return busy_ != index; });
+      for (Result& ready : ready_) {
+        if (ready.index == index && !log_on) result = std::move(ready);
+      }
+      std::erase_if(ready_, [&](const Result& ready) { return log_on || ready.index <= index; });
+      next_ = log_on ? index + 1 : std::max(next_, index + 1);
+      end_ = ahead ? std::min(index + 1 + kAhead, files_.size()) : next_;
       lock.unlock();
       changed_.notify_all();
-    } else {
-      result = Analyze(index);
+    } else if (ahead && index + 1 < files_.size() && !failed_to_start_) {
+      next_ = index + 1;
+      end_ = std::min(index + 1 + kAhead, files_.size());
+      thread_ = platform::Current().StartThread(&LookAhead::Main, this);
+      failed_to_start_ = thread_ == nullptr;
     }
-    for (const std::u16string& line : result.log) WriteLog(line);
+    if (!result.ok) result = Analyze(index);
     *out = std::move(result.analysis);
     return result.ok;
   }
 
  private:
+  static constexpr size_t kNone = static_cast<size_t>(-1);
+  static constexpr size_t kAhead = 3;
+  static constexpr uint32_t kJoinMs = 60000;
+
   struct Result {
+    size_t index = kNone;
     AlertAnalysis analysis;
-    std::vector<std::u16string> log;
     bool ok = false;
   };
 
-  Result Analyze(size_t index) {
+  Result Analyze(size_t index) const {
     Result result;
-    DeferredLog deferred;
+    result.index = index;
     try {
       result.analysis = AnalyzeAlertFile(files_[index], status_, component_);
+      // Only the row and the outcome are needed; the message's texts go on
+      // the thread that made them rather than on the one that commits.
+      result.analysis.sender = std::u16string();
+      result.analysis.subject = std::u16string();
+      result.analysis.body = std::u16string();
       result.ok = true;
     } catch (...) {
     }
-    result.log = deferred.Take();
     return result;
   }
 
+  static void Main(void* self) { static_cast<LookAhead*>(self)->Work(); }
+
   void Work() {
-    for (size_t index = 0; index < files_.size(); ++index) {
-      {
-        std::unique_lock<std::mutex> lock(mutex_);
-        changed_.wait(lock, [&] { return closing_ || wanted_ >= index; });
-        if (closing_) return;
-      }
-      Result result = Analyze(index);
-      {
-        std::unique_lock<std::mutex> lock(mutex_);
-        changed_.wait(lock, [&] { return closing_ || !ready_; });
-        if (closing_) return;
-        slot_ = std::move(result);
-        ready_ = true;
+    SilencedLog silenced;
+    std::unique_lock<std::mutex> lock(mutex_);
+    for (;;) {
+      changed_.wait(lock, [&] { return closing_ || next_ < end_; });
+      if (closing_) break;
+      busy_ = next_++;
+      lock.unlock();
+      Result result = Analyze(busy_);
+      lock.lock();
+      busy_ = kNone;
+      try {
+        ready_.push_back(std::move(result));
+      } catch (...) {
+        // Out of memory: the file is analysed again in its turn.
       }
       changed_.notify_all();
     }
+    finished_ = true;
+    changed_.notify_all();
   }
 
   const StringList& files_;
   const std::u16string& status_;
   const std::u16string& component_;
+  const CycleContext& cycle_;
+  platform::ThreadHandle thread_ = nullptr;
+  bool failed_to_start_ = false;
+
   std::mutex mutex_;
   std::condition_variable changed_;
-  Result slot_;
-  bool ready_ = false;
+  size_t next_ = 0;        // the file the helper analyses next
+  size_t end_ = 0;         // ... as long as it is below this
+  size_t busy_ = kNone;    // the file the helper is analysing
+  std::vector<Result> ready_;  // analysed, not taken yet
   bool closing_ = false;
-  size_t wanted_ = 0;  // the worker analyses files up to this index ahead
-  std::thread worker_;
+  bool finished_ = false;
 };
 
 }  // namespace
@@ -225,9 +273,15 @@ bool EnsureDatabase(const std::u16string& install_folder) {
 }
 
 void ProcessAlertFiles(const std::u16string& install_folder, StringList& files, const std::u16string& status,
-                       const std::u16string& component, const platform::StopSignal* stop, ProcessTally* tally) {
+                       const std::u16string& component, CycleContext* cycle, ProcessTally* tally) {
+  CycleContext own;
+  CycleContext& c = cycle != nullptr ? *cycle : own;
   ProcessTally local;
   ProcessTally& t = tally != nullptr ? *tally : local;
+  if (c.StopRequested()) {
+    t.left += files.size();
+    return;
+  }
   WriteLog(u"Inside void BEProcessSuccessfulAlerts::ProcessAlertFiles( CList<CString, CString>* strListofFilePaths)");
   // The first call of all only creates the database; the files wait for the
   // next cycle.
@@ -237,10 +291,7 @@ void ProcessAlertFiles(const std::u16string& install_folder, StringList& files, 
   }
   const std::u16string db_path =
       CSettingDBManagement::DatabasePath(CSettingDBManagement::GetAlertSummaryFolder(install_folder));
-  // One budget for the whole call: a database another program keeps locked
-  // costs this call a few seconds, not a timeout per file.
-  BusyBudget budget(kProcessingBusyBudgetMs);
-  CSettingDBManagement store(&budget);
+  CSettingDBManagement store(&c.busy);
   if (!store.OpenDB(db_path)) {
     store.CloseDB();
     t.left += files.size();
@@ -248,22 +299,18 @@ void ProcessAlertFiles(const std::u16string& install_folder, StringList& files, 
   }
   WriteLog(u"AlertSummaryDB opened");
 
-  AnalysisPipeline pipeline(files, status, component);
+  LookAhead ahead(files, status, component, c);
   size_t index = 0;
   for (; index < files.size(); ++index) {
-    if (stop != nullptr && stop->Requested()) break;
+    if (c.StopRequested()) break;
     const std::u16string& path = files[index];
     try {
       AlertAnalysis a;
-      if (!pipeline.Next(index, &a)) {
+      if (!ahead.Take(index, &a) || a.outcome == AlertOutcome::kLeave) {
         ++t.left;
         continue;
       }
       platform::FileResult failure;
-      if (a.outcome == AlertOutcome::kLeave) {
-        ++t.left;
-        continue;
-      }
       if (a.outcome == AlertOutcome::kMarkWithout) {
         if (MarkProcessed(path, &failure) == MarkResult::kFailed) {
           LogMarkFailure(path, failure);
@@ -290,15 +337,12 @@ void ProcessAlertFiles(const std::u16string& install_folder, StringList& files, 
         ++t.stored;
         continue;
       }
-      // The file keeps its name and comes back next cycle; without its row
-      // going too, every cycle would store the same alert once more.
       LogMarkFailure(path, failure);
-      if (row_id > 0 && store.ExecuteQuery(u"DELETE FROM AlertDB WHERE rowid = ?1", {DecimalText(row_id)})) {
-        WriteLog(u"Removed the row stored for " + path + u"; it is stored again when the file is processed");
+      if (KeepRowOfUnmarkedFile(store, row_id, path)) {
+        ++t.stored;
       } else {
-        WriteLog(u"Could not remove the row stored for " + path);
+        ++t.left;
       }
-      ++t.left;
     } catch (...) {
       // Out of memory on one message: it stays for the next cycle.
       ++t.left;

@@ -12,6 +12,7 @@
 
 #include "collect/discovery.h"
 #include "platform/platform.h"
+#include "store/busy_budget.h"
 
 namespace asum {
 
@@ -58,15 +59,34 @@ struct ProcessTally {
   uint64_t left = 0;    // files that keep their name for the next cycle
 };
 
+// What every report folder of one collection cycle shares. Made once per
+// cycle, on the cycle's thread, and handed to each ProcessAlertFiles call.
+struct CycleContext {
+  explicit CycleContext(const platform::StopSignal* stop_request = nullptr,
+                        uint32_t busy_ms = kProcessingBusyBudgetMs)
+      : stop(stop_request), busy(busy_ms) {}
+  bool StopRequested() const { return stop != nullptr && stop->Requested(); }
+
+  // Looked at before each report folder, before the database is first
+  // touched and before each file: after a stop only the file in hand is
+  // finished, and the files not reached stay for the next cycle.
+  const platform::StopSignal* stop;
+  // One allowance for waiting on a locked database, for the whole cycle: a
+  // database another program holds costs a cycle this much however many
+  // report folders have files. The files stay for the next cycle.
+  BusyBudget busy;
+};
+
 // The first-call rule: true when the database file exists; otherwise creates
 // it with its table and returns false.
 bool EnsureDatabase(const std::u16string& install_folder);
 
 // Processes `files` (full paths, as the collection cycle lists them) into the
-// database of `install_folder`. Stops between files when `stop` is requested;
-// the files not reached stay for the next cycle.
+// database of `install_folder`. `cycle` is the context of the cycle the call
+// belongs to (null: the call is a cycle of its own). Adds its counts to
+// `tally` when given.
 void ProcessAlertFiles(const std::u16string& install_folder, StringList& files, const std::u16string& status,
-                       const std::u16string& component, const platform::StopSignal* stop = nullptr,
+                       const std::u16string& component, CycleContext* cycle = nullptr,
                        ProcessTally* tally = nullptr);
 
 // The PROC_ name of a path: its folder, the separator, "PROC_" and its name.

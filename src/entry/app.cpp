@@ -1,21 +1,43 @@
 #include "entry/app.h"
 
+#include <mutex>
+
 #include "collect/cycle.h"
 #include "collect/process_alerts.h"
 #include "log/log.h"
 
 namespace asum {
 
-COvranticApp& TheApp() {
-  // Leaked on purpose: a destructor that ran at process exit could meet the
-  // thread mid-cycle. Nothing in it needs tearing down.
-  static COvranticApp* app = new COvranticApp;
-  return *app;
+namespace {
+
+// Storage that is never destroyed: a destructor that ran at process exit could
+// meet the thread mid-cycle, and nothing in the object needs tearing down.
+union AppStorage {
+  constexpr AppStorage() : app() {}
+  ~AppStorage() {}
+  COvranticApp app;
+};
+
+// Built by the compiler, not by code that runs at load: on Windows that code
+// would run under the loader lock, where nothing may take a lock or start a
+// thread. So the object exists from the moment the library is mapped.
+constinit AppStorage g_app;
+
+// Keeps starting and stopping the thread apart. Not a member: a mutex cannot
+// be built by the compiler everywhere (MinGW's needs code), so it is made on
+// first use, which is never at load, and kept for the life of the process.
+std::mutex& StartStopMutex() {
+  static std::mutex* mutex = new std::mutex;
+  return *mutex;
 }
+
+}  // namespace
+
+COvranticApp& TheApp() { return g_app.app; }
 
 void* BEProcessSuccessfulAlerts::GetSuccAlertsInfo() {
   WriteLog(u"Inside HANDLE BEProcessSuccessfulAlerts::GetSuccAlertsInfo()");
-  std::lock_guard<std::mutex> lock(mutex_);
+  std::lock_guard<std::mutex> lock(StartStopMutex());
   if (m_hThread == nullptr || m_hThread->StopRequested()) {
     platform::Current().HoldLibraryLoaded();
     m_hThread = ProcessingThread::Start(kCycleIntervalMs, RunLibraryCycle);
@@ -24,7 +46,7 @@ void* BEProcessSuccessfulAlerts::GetSuccAlertsInfo() {
 }
 
 bool BEProcessSuccessfulAlerts::StopProcessing(uint32_t ms) {
-  std::lock_guard<std::mutex> lock(mutex_);
+  std::lock_guard<std::mutex> lock(StartStopMutex());
   if (m_hThread == nullptr) return true;
   m_hThread->RequestStop();
   return m_hThread->WaitUntilFinished(ms);
@@ -38,10 +60,8 @@ void BEProcessSuccessfulAlerts::ProcessAlertFiles(StringList* strListofFilePaths
 }
 
 void RunLibraryCycle(const platform::StopSignal& stop) {
-  const std::u16string install = InstallFolderOf(platform::Current().ExecutablePath());
-  RunLockedCycle(install, [&](StringList& files, const std::u16string& status, const std::u16string& component) {
-    ProcessAlertFiles(install, files, status, component, &stop);
-  });
+  CycleContext cycle(&stop);
+  RunProcessingCycle(InstallFolderOf(platform::Current().ExecutablePath()), cycle);
 }
 
 }  // namespace asum

@@ -1,12 +1,11 @@
 // The library's application object and its processing object.
 //
-// Exactly one COvranticApp exists, a global built when the library loads. Its
+// Exactly one COvranticApp exists, a global that exists from the moment the
+// library loads (built by the compiler: no code runs for it at load). Its
 // processing object starts the processing thread on the first `_Run` and hands
 // back the same thread on every later one: two threads over the same folders
 // would store every alert twice.
 #pragma once
-
-#include <mutex>
 
 #include "collect/discovery.h"
 #include "entry/processing_thread.h"
@@ -15,6 +14,7 @@ namespace asum {
 
 class BEProcessSuccessfulAlerts {
  public:
+  constexpr BEProcessSuccessfulAlerts() = default;
   virtual ~BEProcessSuccessfulAlerts() = default;
 
   // Starts the processing thread (or returns the running one). The result is
@@ -31,12 +31,12 @@ class BEProcessSuccessfulAlerts {
                          std::u16string strComponentFolder);
 
  private:
-  std::mutex mutex_;
   ProcessingThread* m_hThread = nullptr;  // the thread reference; never freed
 };
 
 class COvranticApp {
  public:
+  constexpr COvranticApp() = default;
   virtual ~COvranticApp() = default;
   bool InitInstance() { return true; }
   BEProcessSuccessfulAlerts& Processor() { return m_processor; }

@@ -1,6 +1,7 @@
 #include "extract/html_table.h"
 
 #include <algorithm>
+#include <array>
 #include <cstdint>
 
 #include "extract/text_ops.h"
@@ -12,14 +13,50 @@ namespace {
 
 constexpr std::size_t kNone = std::u16string_view::npos;
 
-constexpr std::u16string_view kTableOpen = u"<table";
-constexpr std::u16string_view kTableClose = u"</table>";
-constexpr std::u16string_view kBodyOpen = u"<tbody>";
-constexpr std::u16string_view kHeaderCellEnd = u"</th>";
-constexpr std::u16string_view kDataCellEnd = u"</td>";
-constexpr std::u16string_view kRowEnd = u"</tr>";
-constexpr std::u16string_view kBoldMarker = u"<strong>";
-constexpr std::u16string_view kEmptyParagraph = u"<p>&nbsp;</p>";
+// A marker found with the Horspool skip: an alert body is scanned for the
+// same few tags again and again, and a search that looked at every character
+// was the largest part of reading its tables. Markers are ASCII.
+class Marker {
+ public:
+  constexpr explicit Marker(std::u16string_view text) : text_(text) {
+    skip_.fill(static_cast<uint8_t>(text.size()));
+    for (std::size_t i = 0; i + 1 < text.size(); ++i) skip_[text[i] & 0x7F] = static_cast<uint8_t>(text.size() - 1 - i);
+  }
+  constexpr operator std::u16string_view() const { return text_; }
+  constexpr std::size_t size() const { return text_.size(); }
+
+  // As std::u16string_view::find(marker, from).
+  std::size_t In(std::u16string_view text, std::size_t from = 0) const {
+    const std::size_t m = text_.size();
+    if (text.size() < m || from > text.size() - m) return kNone;
+    const char16_t last = text_[m - 1];
+    for (std::size_t pos = from; pos <= text.size() - m;) {
+      const char16_t c = text[pos + m - 1];
+      if (c == last && text.substr(pos, m - 1) == text_.substr(0, m - 1)) return pos;
+      pos += c < 0x80 ? skip_[c] : m;
+    }
+    return kNone;
+  }
+
+ private:
+  std::u16string_view text_;
+  std::array<uint8_t, 0x80> skip_{};
+};
+
+// Find's answer (-1 when absent) for a marker.
+std::ptrdiff_t FirstAt(std::u16string_view text, const Marker& marker) {
+  const std::size_t at = marker.In(text);
+  return at == kNone ? -1 : static_cast<std::ptrdiff_t>(at);
+}
+
+constexpr Marker kTableOpen{u"<table"};
+constexpr Marker kTableClose{u"</table>"};
+constexpr Marker kBodyOpen{u"<tbody>"};
+constexpr Marker kHeaderCellEnd{u"</th>"};
+constexpr Marker kDataCellEnd{u"</td>"};
+constexpr Marker kRowEnd{u"</tr>"};
+constexpr Marker kBoldMarker{u"<strong>"};
+constexpr Marker kEmptyParagraph{u"<p>&nbsp;</p>"};
 constexpr std::u16string_view kReferenceOpen = u"&#";
 
 // The first occurrence of a marker at or after a position that only ever
@@ -28,12 +65,11 @@ constexpr std::u16string_view kReferenceOpen = u"&#";
 // searched twice.
 class ForwardSearch {
  public:
-  ForwardSearch(std::u16string_view text, std::u16string_view marker)
-      : text_(text), marker_(marker) {}
+  ForwardSearch(std::u16string_view text, const Marker& marker) : text_(text), marker_(marker) {}
 
   std::size_t From(std::size_t from) {
     if (!searched_ || (hit_ != kNone && hit_ < from)) {
-      hit_ = text_.find(marker_, from);
+      hit_ = marker_.In(text_, from);
       searched_ = true;
     }
     return hit_;
@@ -41,14 +77,14 @@ class ForwardSearch {
 
  private:
   std::u16string_view text_;
-  std::u16string_view marker_;
+  const Marker& marker_;
   std::size_t hit_ = kNone;
   bool searched_ = false;
 };
 
 std::u16string CellText(std::u16string_view piece, bool data_cell) {
   std::u16string replaced;
-  if (data_cell && piece.find(kEmptyParagraph) != kNone) {
+  if (data_cell && kEmptyParagraph.In(piece) != kNone) {
     replaced = Replace(piece, kEmptyParagraph, u" ");
     piece = replaced;
   }
@@ -65,15 +101,23 @@ std::u16string DecodeHtmlNumericEntities(std::u16string_view text) {
   while (from < text.size()) {
     const std::size_t semicolon = text.find(u';', from);
     if (semicolon == kNone) break;  // the tail after the last ';' is dropped
-    number.clear();
-    for (std::size_t i = from; i < semicolon; ++i) {
-      if (text.substr(i, kReferenceOpen.size()) == kReferenceOpen) {
-        ++i;
-        continue;
+    const std::u16string_view piece = text.substr(from, semicolon - from);
+    std::u16string_view digits;
+    if (piece.starts_with(kReferenceOpen) && piece.find(kReferenceOpen, kReferenceOpen.size()) == kNone) {
+      // The usual "&#" and digits: read where they stand.
+      digits = piece.substr(kReferenceOpen.size());
+    } else {
+      number.clear();
+      for (std::size_t i = 0; i < piece.size(); ++i) {
+        if (piece.substr(i, kReferenceOpen.size()) == kReferenceOpen) {
+          ++i;
+          continue;
+        }
+        number.push_back(piece[i]);
       }
-      number.push_back(text[i]);
+      digits = number;
     }
-    const uint32_t code = static_cast<uint32_t>(WcstolBase10(number));
+    const uint32_t code = static_cast<uint32_t>(WcstolBase10(digits));
     result.push_back(static_cast<char16_t>(code & 0xFFFFu));
     from = semicolon + 1;
   }
@@ -103,14 +147,14 @@ void GetAllColFromHtmlTable(int tableIndex, std::vector<std::u16string>& headerL
   if (body.empty()) return;
   std::u16string_view rest;
   if (tableIndex == 0) {
-    rest = MidView(body, Find(body, kTableOpen));
+    rest = MidView(body, FirstAt(body, kTableOpen));
   } else if (tableIndex == 1) {
-    rest = MidView(body, Find(body, kTableClose));
+    rest = MidView(body, FirstAt(body, kTableClose));
   } else {
     return;
   }
   std::size_t from = 0;
-  for (std::size_t end; (end = rest.find(kHeaderCellEnd, from)) != kNone;
+  for (std::size_t end; (end = kHeaderCellEnd.In(rest, from)) != kNone;
        from = end + kHeaderCellEnd.size()) {
     headerList.push_back(CellText(rest.substr(from, end - from), false));
   }
@@ -122,21 +166,21 @@ void GetAllRowFromHtmlTable(int tableIndex, std::u16string_view body,
   if (body.empty()) return;
   std::u16string_view rest;
   if (tableIndex == 0) {
-    rest = MidView(body, Find(body, kBodyOpen));
+    rest = MidView(body, FirstAt(body, kBodyOpen));
   } else if (tableIndex == 1) {
-    rest = MidView(body, Find(body, kTableClose));
+    rest = MidView(body, FirstAt(body, kTableClose));
   } else {
     return;
   }
   std::size_t from = 0;
-  for (std::size_t end; (end = rest.find(kRowEnd, from)) != kNone;
+  for (std::size_t end; (end = kRowEnd.In(rest, from)) != kNone;
        from = end + kRowEnd.size()) {
     const std::u16string_view row = rest.substr(from, end - from);
     // Bold rows are captions and group titles inside the table, not data.
-    if (row.find(kBoldMarker) != kNone) continue;
+    if (kBoldMarker.In(row) != kNone) continue;
     CRowHtml candidate;
     std::size_t cell_from = 0;
-    for (std::size_t cell_end; (cell_end = row.find(kDataCellEnd, cell_from)) != kNone;
+    for (std::size_t cell_end; (cell_end = kDataCellEnd.In(row, cell_from)) != kNone;
          cell_from = cell_end + kDataCellEnd.size()) {
       candidate.cells.push_back(CellText(row.substr(cell_from, cell_end - cell_from), true));
     }

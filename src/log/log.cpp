@@ -6,20 +6,24 @@
 namespace asum {
 namespace {
 
-// A plain pointer: nothing to destroy when a thread ends.
-thread_local DeferredLog* t_deferred = nullptr;
+thread_local bool t_silenced = false;
 
 }  // namespace
 
-DeferredLog::DeferredLog() : previous_(t_deferred) { t_deferred = this; }
-DeferredLog::~DeferredLog() { t_deferred = previous_; }
+SilencedLog::SilencedLog() : previous_(t_silenced) { t_silenced = true; }
+SilencedLog::~SilencedLog() { t_silenced = previous_; }
+
+bool LogEnabled() {
+  try {
+    return platform::Current().PathExists(platform::LogFolder());
+  } catch (...) {
+    return false;
+  }
+}
 
 void WriteLog(const std::u16string& message) {
+  if (t_silenced) return;
   try {
-    if (t_deferred != nullptr) {
-      t_deferred->messages_.push_back(message);
-      return;
-    }
     platform::Env& env = platform::Current();
     const std::u16string folder = platform::LogFolder();
     if (folder.empty() || !env.PathExists(folder)) return;

@@ -18,23 +18,23 @@ inline constexpr uint64_t kLogSizeLimit = 5266225;
 
 void WriteLog(const std::u16string& message);
 
-// Holds back the messages this thread writes while the object lives, so that
-// work done ahead on a helper thread can have its lines written later, in the
-// order a single thread would have written them. Only the messages are kept:
-// the timestamp is taken when they are written.
-class DeferredLog {
- public:
-  DeferredLog();
-  ~DeferredLog();
-  DeferredLog(const DeferredLog&) = delete;
-  DeferredLog& operator=(const DeferredLog&) = delete;
+// True while the log is on (its folder exists). A message written right after
+// may still find it switched the other way.
+bool LogEnabled();
 
-  std::vector<std::u16string> Take() { return std::move(messages_); }
+// Drops the messages this thread writes while the object lives. For work done
+// ahead on a helper thread while the log is off: such work has nothing to
+// write, and must not write from the wrong thread, out of order, should the
+// log be switched on meanwhile (its owner then does that work again itself).
+class SilencedLog {
+ public:
+  SilencedLog();
+  ~SilencedLog();
+  SilencedLog(const SilencedLog&) = delete;
+  SilencedLog& operator=(const SilencedLog&) = delete;
 
  private:
-  friend void WriteLog(const std::u16string& message);
-  DeferredLog* previous_;
-  std::vector<std::u16string> messages_;
+  bool previous_;
 };
 
 }  // namespace asum

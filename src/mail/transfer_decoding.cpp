@@ -24,20 +24,26 @@ int HexValue(char c) {
 }
 
 // A cut group still yields its whole bytes (the padding case).
-void FlushPartial(uint32_t bits, int count, std::string* out) {
+void FlushPartial(uint32_t bits, int count, char* out, size_t* n) {
   if (count == 2) {
-    out->push_back(static_cast<char>((bits >> 4) & 0xFF));
+    out[(*n)++] = static_cast<char>((bits >> 4) & 0xFF);
   } else if (count == 3) {
-    out->push_back(static_cast<char>((bits >> 10) & 0xFF));
-    out->push_back(static_cast<char>((bits >> 2) & 0xFF));
+    out[(*n)++] = static_cast<char>((bits >> 10) & 0xFF);
+    out[(*n)++] = static_cast<char>((bits >> 2) & 0xFF);
   }
 }
 
 }  // namespace
 
+// Both decoders write into a buffer sized once for the most they can give
+// and cut it to what they gave: alert bodies pass through here whole, and
+// appending byte by byte cost more than the rest of reading a message.
 std::string DecodeBase64(std::string_view text) {
-  std::string out;
-  out.reserve(text.size() / 4 * 3 + 3);
+  // Every four characters give three bytes; a cut group gives at most two
+  // more, and so does every padding that ends a group early.
+  std::string buffer(text.size() / 4 * 3 + 3, '\0');
+  char* out = buffer.data();
+  size_t n = 0;
   uint32_t bits = 0;
   int count = 0;
   for (char ch : text) {
@@ -45,7 +51,7 @@ std::string DecodeBase64(std::string_view text) {
     // Padding ends a group; writers that join several encoded blocks put
     // more data after it, so decoding goes on with a fresh group.
     if (ch == '=') {
-      FlushPartial(bits, count, &out);
+      FlushPartial(bits, count, out, &n);
       bits = 0;
       count = 0;
       continue;
@@ -53,25 +59,28 @@ std::string DecodeBase64(std::string_view text) {
     if (v < 0) continue;
     bits = (bits << 6) | static_cast<uint32_t>(v);
     if (++count == 4) {
-      out.push_back(static_cast<char>((bits >> 16) & 0xFF));
-      out.push_back(static_cast<char>((bits >> 8) & 0xFF));
-      out.push_back(static_cast<char>(bits & 0xFF));
+      out[n++] = static_cast<char>((bits >> 16) & 0xFF);
+      out[n++] = static_cast<char>((bits >> 8) & 0xFF);
+      out[n++] = static_cast<char>(bits & 0xFF);
       bits = 0;
       count = 0;
     }
   }
-  FlushPartial(bits, count, &out);
-  return out;
+  FlushPartial(bits, count, out, &n);
+  buffer.resize(n);
+  return buffer;
 }
 
 std::string DecodeQuotedPrintable(std::string_view text) {
-  std::string out;
-  out.reserve(text.size());
+  // Never more bytes out than in.
+  std::string buffer(text.size(), '\0');
+  char* out = buffer.data();
+  size_t n = 0;
   size_t i = 0;
   while (i < text.size()) {
     const char c = text[i];
     if (c != '=') {
-      out.push_back(c);
+      out[n++] = c;
       ++i;
       continue;
     }
@@ -88,14 +97,15 @@ std::string DecodeQuotedPrintable(std::string_view text) {
     }
     if (j == text.size()) break;  // a soft break at the very end
     if (i + 2 < text.size() && HexValue(text[i + 1]) >= 0 && HexValue(text[i + 2]) >= 0) {
-      out.push_back(static_cast<char>(HexValue(text[i + 1]) * 16 + HexValue(text[i + 2])));
+      out[n++] = static_cast<char>(HexValue(text[i + 1]) * 16 + HexValue(text[i + 2]));
       i += 3;
       continue;
     }
-    out.push_back(c);
+    out[n++] = c;
     ++i;
   }
-  return out;
+  buffer.resize(n);
+  return buffer;
 }
 
 std::string DecodeTransfer(std::string_view text, std::string_view encoding) {

@@ -131,6 +131,8 @@ class Env {
   // a macro, so files that include it see the same class.)
   virtual FileResult RenameNoReplace(const std::u16string& from, const std::u16string& to);
   virtual FileResult RemoveFile(const std::u16string& path);  // DeleteFileW
+  // The size of a file in bytes, without opening it. A folder gives kIsFolder.
+  virtual FileResult FileSize(const std::u16string& path, uint64_t* size);
   // Reads a whole file. On Windows the file is opened with FILE_SHARE_READ only,
   // so a file that a writer still holds open fails with kSharingViolation and is
   // read in a later cycle. POSIX has no share modes: a file being written is
@@ -149,8 +151,9 @@ class Env {
 
   // Creates `path` when missing and locks it for this holder alone, without
   // waiting (LockFileEx on Windows, flock on POSIX). Null when another holder
-  // has it, or when the file cannot be opened (access denied counts as held).
-  virtual FileLock TryLockFile(const std::u16string& path);
+  // has it (`failure` then says kSharingViolation) or when the file cannot be
+  // created or opened (`failure` says why: access denied, a folder, ...).
+  virtual FileLock TryLockFile(const std::u16string& path, FileResult* failure);
   virtual void UnlockFile(FileLock lock);
   // Whether another holder has the lock that TryLockFile takes, asked without
   // waiting and without changing anything: an existing file is opened for

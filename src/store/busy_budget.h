@@ -31,8 +31,10 @@ class BusyBudget {
   uint32_t RemainingMs() const {
     return Exhausted() ? 0 : static_cast<uint32_t>(total_ms_ - spent_ms_);
   }
-  // Called after each wait; virtual so a test can act while a statement waits.
-  virtual void Charge(uint64_t ms) { spent_ms_ += ms; }
+  // A wait that overran what was left is charged only that: the budget counts
+  // the waiting it granted, so what it spent never exceeds its total. Called
+  // after each wait; virtual so a test can act while a statement waits.
+  virtual void Charge(uint64_t ms) { spent_ms_ = ms >= RemainingMs() ? total_ms_ : spent_ms_ + ms; }
 
  private:
   uint32_t total_ms_;

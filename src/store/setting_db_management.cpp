@@ -49,12 +49,21 @@ std::u16string CSettingDBManagement::DatabasePath(const std::u16string& summary_
 }
 
 bool CSettingDBManagement::OpenDB(const std::u16string& path) {
+  kept_.reset();
   const bool existed = platform::Current().PathExists(path);
   const bool opened = db_.Open(path);
   WriteLog(u"Inside OpenDB function: " + path);
-  if (!existed) return db_.Statement(CreateAlertTableSql())->Execute();
+  if (!existed) return CreateTable() || (opened && HasAlertTable());
   if (opened) CreateMissingTable(path);
   return opened;
+}
+
+bool CSettingDBManagement::CreateTable() { return db_.Statement(CreateAlertTableSql())->Execute(); }
+
+bool CSettingDBManagement::HasAlertTable() {
+  std::unique_ptr<CSqlStatement> probe =
+      db_.Statement(u"SELECT count(*) FROM sqlite_master WHERE type = 'table' AND name = 'AlertDB'");
+  return probe->NextRow() && probe->ValueString(0) == u"1";
 }
 
 void CSettingDBManagement::CreateMissingTable(const std::u16string& path) {
@@ -65,16 +74,41 @@ void CSettingDBManagement::CreateMissingTable(const std::u16string& path) {
       db_.Statement(u"SELECT count(*) FROM sqlite_master WHERE type = 'table' AND name = 'AlertDB'");
   if (!probe->NextRow() || probe->ValueString(0) != u"0") return;
   probe.reset();
-  const bool created = db_.Statement(CreateAlertTableSql())->Execute();
+  const bool created = CreateTable();
   WriteLog(u"AlertDB table missing in " + path + (created ? u"; created it" : u"; could not create it"));
 }
 
-bool CSettingDBManagement::CloseDB() { return db_.Close(); }
+bool CSettingDBManagement::CloseDB() {
+  kept_.reset();
+  return db_.Close();
+}
 
 bool CSettingDBManagement::ExecuteQuery(const std::u16string& sql, const std::vector<std::u16string>& params) {
-  bool ok = Prepare(db_, sql, params)->Execute();
-  WriteLog(ExecuteQueryStatusLine(ok));
-  for (int attempt = 1; !ok && attempt < kExecuteAttempts; ++attempt) ok = Prepare(db_, sql, params)->Execute();
+  // The statement that last ran is kept and run again when the same text
+  // comes back, as the insert does for every alert: compiling it afresh cost
+  // the processing thread more than the rest of its share of an alert. A kept
+  // statement that fails (a schema changed by another connection, a busy
+  // database) is dropped, and the attempts go on exactly as with fresh
+  // statements, the log line included.
+  if (kept_ != nullptr && kept_sql_ == sql) {
+    bool bound = true;
+    for (size_t i = 0; i < params.size(); ++i) bound = kept_->BindText(static_cast<int>(i + 1), params[i]) && bound;
+    if (bound && kept_->Execute()) {
+      WriteLog(ExecuteQueryStatusLine(true));
+      return true;
+    }
+    kept_.reset();
+  }
+  bool ok = false;
+  for (int attempt = 0; !ok && attempt < kExecuteAttempts; ++attempt) {
+    std::unique_ptr<CSqlStatement> statement = Prepare(db_, sql, params);
+    ok = statement->Execute();
+    if (attempt == 0) WriteLog(ExecuteQueryStatusLine(ok));
+    if (ok) {
+      kept_ = std::move(statement);
+      kept_sql_ = sql;
+    }
+  }
   return ok;
 }
 

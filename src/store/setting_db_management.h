@@ -43,15 +43,18 @@ class CSettingDBManagement {
 
   // Opens the file, logging "Inside OpenDB function: " + path. A file that did
   // not exist before gets the AlertDB table (the result is then that of the
-  // CREATE TABLE). An existing database without the table (left empty by a
-  // crash during its creation) gets it too, with a log line; a file that is
-  // not a database is opened and left untouched.
+  // CREATE TABLE, except that a table another caller created meanwhile, two
+  // first callers racing, counts as created). An existing database without
+  // the table (left empty by a crash during its creation) gets it too, with a
+  // log line; a file that is not a database is opened and left untouched.
   bool OpenDB(const std::u16string& path);
   bool CloseDB();
 
   // Up to seven attempts, each compiling the text afresh and binding
   // `params` to ?1, ?2, ...; logs "Inside ExecuteQuery function - Status: "
   // and "success" or "failure" after the first. True when an attempt ran.
+  // (The statement of the last call is kept for the next call of the same
+  // text; that changes nothing but the time a repeated statement takes.)
   bool ExecuteQuery(const std::u16string& sql, const std::vector<std::u16string>& params = {});
   // One attempt: column 0 of the first row, or empty.
   std::u16string ExecuteScalar(const std::u16string& sql, const std::vector<std::u16string>& params = {});
@@ -70,9 +73,14 @@ class CSettingDBManagement {
   CDbSQLite& Connection() { return db_; }
 
  private:
+  bool CreateTable();
+  bool HasAlertTable();
   void CreateMissingTable(const std::u16string& path);
 
   CDbSQLite db_;
+  // The statement ExecuteQuery ran last, and its text; gone before db_ goes.
+  std::unique_ptr<CSqlStatement> kept_;
+  std::u16string kept_sql_;
 };
 
 // The log line's text after the first attempt of ExecuteQuery.

@@ -45,22 +45,21 @@ bool CDbSQLite::Open(const std::u16string& path) {
   const std::u16string file = UpToFirstNul(path);
   sqlite3* db = nullptr;
   const int rc = sqlite3_open16(file.c_str(), &db);
-  if (rc != SQLITE_OK) {
-    // SQLite may hand back a connection even when the open failed; it is ours to release.
-    if (db != nullptr) sqlite3_close(db);
-    return false;
-  }
-  db_ = db;
-  sqlite3_busy_handler(db_, &CDbSQLite::OnBusy, this);
-  return true;
+  return Adopt(rc, db);
 }
 
 bool CDbSQLite::OpenReadOnly(const std::u16string& path) {
   Close();
-  // The UTF-16 entry point knows no flags; SQLite takes UTF-8 names on every platform.
+  // The flags exist only on the UTF-8 entry point.
   const std::string file = Utf16ToUtf8(UpToFirstNul(path));
   sqlite3* db = nullptr;
-  if (sqlite3_open_v2(file.c_str(), &db, SQLITE_OPEN_READONLY, nullptr) != SQLITE_OK) {
+  const int rc = sqlite3_open_v2(file.c_str(), &db, SQLITE_OPEN_READONLY, nullptr);
+  return Adopt(rc, db);
+}
+
+bool CDbSQLite::Adopt(int rc, sqlite3* db) {
+  if (rc != SQLITE_OK) {
+    // SQLite may hand back a connection even when the open failed; it is ours to release.
     if (db != nullptr) sqlite3_close(db);
     return false;
   }
@@ -116,7 +115,8 @@ CSqlStatement::CSqlStatement(const std::u16string& sql, CDbSQLite* owner) : owne
   if (owner->db_ == nullptr) return;
   // The legacy interface, to the text's first zero, without a tail: whatever
   // follows the first statement is ignored.
-  if (sqlite3_prepare16(owner->db_, sql.c_str(), -1, &stmt_, nullptr) != SQLITE_OK) {
+  last_code_ = sqlite3_prepare16(owner->db_, sql.c_str(), -1, &stmt_, nullptr);
+  if (last_code_ != SQLITE_OK) {
     if (stmt_ != nullptr) sqlite3_finalize(stmt_);
     stmt_ = nullptr;
   }
@@ -129,14 +129,15 @@ CSqlStatement::~CSqlStatement() {
 
 bool CSqlStatement::BindText(int index, const std::u16string& value) {
   if (stmt_ == nullptr) return false;
-  const std::u16string text = UpToFirstNul(value);
-  const auto bytes = static_cast<int>(std::min<size_t>(text.size() * sizeof(char16_t), 0x7FFFFFF0));
-  return sqlite3_bind_text16(stmt_, index, text.data(), bytes, SQLITE_TRANSIENT) == SQLITE_OK;
+  // SQLite copies the text up to its first zero; no copy of our own first.
+  const size_t length = std::min(value.find(u'\0'), value.size());
+  const auto bytes = static_cast<int>(std::min<size_t>(length * sizeof(char16_t), 0x7FFFFFF0));
+  return sqlite3_bind_text16(stmt_, index, value.data(), bytes, SQLITE_TRANSIENT) == SQLITE_OK;
 }
 
 bool CSqlStatement::Execute() {
   if (stmt_ == nullptr) return false;
-  const int rc = sqlite3_step(stmt_);
+  const int rc = last_code_ = sqlite3_step(stmt_);
   if (rc == SQLITE_ROW || rc == SQLITE_DONE) {
     sqlite3_reset(stmt_);
     return true;
@@ -146,11 +147,13 @@ bool CSqlStatement::Execute() {
 
 bool CSqlStatement::NextRow() {
   if (stmt_ == nullptr) return false;
-  const int rc = sqlite3_step(stmt_);
+  const int rc = last_code_ = sqlite3_step(stmt_);
   if (rc == SQLITE_ROW) return true;
   if (rc == SQLITE_DONE) sqlite3_reset(stmt_);
   return false;
 }
+
+bool CSqlStatement::FoundNotADatabase() const { return last_code_ == SQLITE_NOTADB; }
 
 std::u16string CSqlStatement::ValueString(int column) {
   value_.clear();

@@ -64,6 +64,7 @@ class CDbSQLite {
  private:
   friend class CSqlStatement;
   static int OnBusy(void* self, int attempts);
+  bool Adopt(int rc, sqlite3* db);
   void Forget(CSqlStatement* statement);
   void Detach(sqlite3_stmt* handle);
 
@@ -96,6 +97,9 @@ class CSqlStatement {
   // The column of the current row as text, ending before its first character
   // of code 0; empty for NULL or when there is no row.
   std::u16string ValueString(int column);
+  // True when the compile or the last step found that the file is not a
+  // database (as opposed to busy, missing or unreadable).
+  bool FoundNotADatabase() const;
 
  private:
   friend class CDbSQLite;
@@ -104,6 +108,7 @@ class CSqlStatement {
   sqlite3_stmt* stmt_ = nullptr;
   CDbSQLite* owner_ = nullptr;
   std::u16string value_;
+  int last_code_ = 0;  // of the compile, then of the last step
 };
 
 // SQLite wants a UTF-16 text to end at its first character of code 0; values

@@ -4,8 +4,11 @@
 #include <sqlite3.h>
 
 #include <algorithm>
+#include <mutex>
+#include <thread>
 
 #include "collect/cycle.h"
+#include "mail/cls_email.h"
 #include "support/test_support.h"
 
 namespace asum {
@@ -231,33 +234,61 @@ TEST_F(ProcessAlertFilesTest, AFailedInsertLeavesTheFileForTheNextCycle) {
   EXPECT_EQ(ReadRows(dir_.path()).size(), 1u);
 }
 
-class RefusingRename : public platform::Env {
+// Renames fail: refused while the file stays, or because someone removed the
+// file after it was read.
+class FailingRename : public platform::Env {
  public:
-  platform::FileResult RenameNoReplace(const std::u16string&, const std::u16string&) override {
-    return {platform::FileStatus::kAccessDenied, 5};
+  explicit FailingRename(bool vanish) : vanish_(vanish) {}
+  platform::FileResult RenameNoReplace(const std::u16string& from, const std::u16string&) override {
+    if (!vanish_) return {platform::FileStatus::kAccessDenied, 5};
+    RemoveFile(from);
+    return {platform::FileStatus::kNotFound, 2};
   }
+
+ private:
+  bool vanish_;
 };
 
-TEST_F(ProcessAlertFilesTest, AFailedRenameRemovesTheRowAndGoesOn) {
-  const auto first = Place(u"Comp", u"a.eml", Message("Email Alert: T \"N\" (S(C)\\R\\X)", kActivityTable));
-  const auto second = Place(u"Comp", u"b.eml", Message("Email Alert: T \"M\" (S(C)\\R\\X)", kActivityTable));
-  {
-    RefusingRename refusing;
-    platform::ScopedEnv scope(&refusing);
-    const ProcessTally tally = Process(u"Comp", {first, second});
-    EXPECT_EQ(tally.left, 2u);
-  }
-  EXPECT_TRUE(ReadRows(dir_.path()).empty()) << "a row whose file keeps its name would be stored again";
-  EXPECT_EQ(Names(u"Comp"), (std::vector<std::u16string>{u"a.eml", u"b.eml"}));
-  const auto messages = log_.Messages();
-  EXPECT_NE(std::find(messages.begin(), messages.end(),
-                      first + u" could not be renamed to its PROC_ name: access denied (5)"),
-            messages.end());
+TEST_F(ProcessAlertFilesTest, AFailedRenameRemovesTheRowOnlyWhileTheFileIsThere) {
+  struct Case {
+    bool vanish;
+    const char16_t* failure;  // as the log line names it
+    size_t rows_after;        // rows once the cycle with the failing renames is over
+  };
+  const Case cases[] = {
+      {false, u"access denied (5)", 0},  // the file comes back next cycle and is stored then
+      {true, u"not found (2)", 2},       // the row is all that is left of the alert
+  };
+  for (const Case& c : cases) {
+    SCOPED_TRACE(c.vanish ? "vanished" : "refused");
+    TempDir dir;
+    const auto place = [&](const std::u16string& name, const std::string& subject) {
+      const std::u16string path = dir.Join(u"Comp\\AlertReports\\Sent items\\" + name);
+      WriteText(path, Message(subject, kActivityTable));
+      return path;
+    };
+    const StringList files{place(u"a.eml", "Email Alert: T \"N\" (S(C)\\R\\X)"),
+                           place(u"b.eml", "Email Alert: T \"M\" (S(C)\\R\\X)")};
+    EnsureDatabase(dir.path());
+    {
+      FailingRename failing(c.vanish);
+      platform::ScopedEnv scope(&failing);
+      StringList listed = files;
+      ProcessTally tally;
+      ProcessAlertFiles(dir.path(), listed, u"Delivered", u"Comp", nullptr, &tally);
+      EXPECT_EQ(tally.stored, c.rows_after);
+    }
+    EXPECT_EQ(ReadRows(dir.path()).size(), c.rows_after);
+    const auto messages = log_.Messages();
+    EXPECT_NE(std::find(messages.begin(), messages.end(),
+                        files[0] + u" could not be renamed to its PROC_ name: " + c.failure),
+              messages.end());
 
-  // The next cycle, with renames working again, stores each alert once.
-  const ProcessTally tally = Process(u"Comp", {first, second});
-  EXPECT_EQ(tally.stored, 2u);
-  EXPECT_EQ(ReadRows(dir_.path()).size(), 2u);
+    // The next cycle, with renames working again, ends with each alert stored once.
+    StringList listed = files;
+    ProcessAlertFiles(dir.path(), listed, u"Delivered", u"Comp");
+    EXPECT_EQ(ReadRows(dir.path()).size(), 2u);
+  }
 }
 
 TEST(ProcName, PrefixesTheFileName) {
@@ -292,6 +323,102 @@ TEST_F(ProcessAlertFilesTest, AFileStillBeingWrittenWaitsForTheNextCycle) {
                       path + u" is still being written (in use by another process (32)); it is offered again next cycle"),
             messages.end());
   EXPECT_EQ(Process(u"Comp", {path}).stored, 1u);
+}
+
+// A file as large as the test says, as far as its size goes; beyond the cap
+// the read refuses it as the real backend would.
+class SizedFile : public platform::Env {
+ public:
+  explicit SizedFile(uint64_t size) : size_(size) {}
+  platform::FileResult FileSize(const std::u16string&, uint64_t* size) override {
+    *size = size_;
+    return {};
+  }
+  platform::FileResult ReadFile(const std::u16string& path, std::string* bytes, uint64_t max_bytes) override {
+    if (size_ > max_bytes) return {platform::FileStatus::kTooLarge, 0};
+    return Env::ReadFile(path, bytes, max_bytes);
+  }
+
+ private:
+  uint64_t size_;
+};
+
+TEST_F(ProcessAlertFilesTest, AFileOverTheReadersCapKeepsItsNameWithALineSayingWhy) {
+  const uint64_t cap = mail::kMaxMessageFileBytes;
+  const auto path = Place(u"Comp", u"a.eml", Message("Email Alert: T \"N\" (S(C)\\R\\X)", kActivityTable));
+  const std::u16string line = path + u" holds 134217729 bytes, more than the 134217728 an alert file may hold; "
+                                     u"it keeps its name";
+  struct Case {
+    uint64_t size;
+    uint64_t left;
+    int lines;  // of the line above, in all so far
+  };
+  for (const Case& c : {Case{cap + 1, 1, 1}, Case{cap + 1, 1, 2}, Case{cap, 0, 2}}) {
+    SizedFile sized(c.size);
+    platform::ScopedEnv scope(&sized);
+    EXPECT_EQ(Process(u"Comp", {path}).left, c.left);
+    const auto messages = log_.Messages();
+    EXPECT_EQ(std::count(messages.begin(), messages.end(), line), c.lines);
+  }
+  EXPECT_EQ(Names(u"Comp"), std::vector<std::u16string>{u"PROC_a.eml"});
+}
+
+// For each file read: the thread that read it, and how many files the log had
+// seen finished by then.
+class ReadWatcher : public platform::Env {
+ public:
+  explicit ReadWatcher(const test::CapturedLog& log) : log_(log) {}
+  platform::FileResult ReadFile(const std::u16string& path, std::string* bytes, uint64_t max_bytes) override {
+    const auto messages = log_.Messages();
+    const auto finished = std::count_if(messages.begin(), messages.end(), [](const std::u16string& m) {
+      return m.ends_with(u"Successfully renamed");
+    });
+    {
+      std::lock_guard<std::mutex> lock(mutex_);
+      reads_.push_back({std::this_thread::get_id(), static_cast<int>(finished)});
+    }
+    return Env::ReadFile(path, bytes, max_bytes);
+  }
+  std::vector<std::pair<std::thread::id, int>> reads() {
+    std::lock_guard<std::mutex> lock(mutex_);
+    return reads_;
+  }
+
+ private:
+  const test::CapturedLog& log_;
+  std::mutex mutex_;
+  std::vector<std::pair<std::thread::id, int>> reads_;
+};
+
+// Should reading a file bring the process down, the log's last lines must
+// name that file: with the log on, nothing is read ahead or written later by
+// another thread. With it off, files may be read ahead; all are stored.
+TEST_F(ProcessAlertFilesTest, WithTheLogOnEachFileIsReadOnTheProcessingThreadAfterThePreviousIsDone) {
+  for (const bool log_on : {true, false}) {
+    SCOPED_TRACE(log_on ? "log on" : "log off");
+    const std::u16string component = log_on ? u"On" : u"Off";
+    StringList files;
+    for (const char16_t* name : {u"a.eml", u"b.eml", u"c.eml"}) {
+      files.push_back(Place(component, name, Message("Email Alert: T \"N\" (S(C)\\R\\X)", kActivityTable)));
+    }
+    const std::u16string log_folder = platform::LogFolder();
+    if (!log_on) platform::SetLogFolder(log_folder + u"-absent");
+    ReadWatcher watcher(log_);
+    ProcessTally tally;
+    {
+      platform::ScopedEnv scope(&watcher);
+      tally = Process(component, files);
+    }
+    platform::SetLogFolder(log_folder);
+    EXPECT_EQ(tally.stored, 3u);
+    if (!log_on) continue;
+    const auto reads = watcher.reads();
+    ASSERT_EQ(reads.size(), 3u);
+    for (int k = 0; k < 3; ++k) {
+      EXPECT_EQ(reads[k].first, std::this_thread::get_id()) << k;
+      EXPECT_EQ(reads[k].second, k) << "file " << k << " was read before the one ahead of it was finished";
+    }
+  }
 }
 
 }  // namespace

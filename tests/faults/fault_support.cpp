@@ -40,21 +40,10 @@ std::u16string Install::DropAtomically(const std::u16string& name, const std::st
   return target;
 }
 
-AlertFileProcessor Install::Processor(ProcessTally* tally, std::atomic<uint64_t>* stored) const {
-  const std::u16string install = path();
-  return [install, tally, stored](StringList& files, const std::u16string& status, const std::u16string& component) {
-    ProcessTally t;
-    ProcessAlertFiles(install, files, status, component, nullptr, &t);
-    if (tally != nullptr) {
-      tally->stored += t.stored;
-      tally->marked += t.marked;
-      tally->left += t.left;
-    }
-    if (stored != nullptr) stored->fetch_add(t.stored);
-  };
+CycleResult Install::Cycle(ProcessTally* tally, CycleContext* cycle) const {
+  CycleContext own;
+  return RunProcessingCycle(path(), cycle != nullptr ? *cycle : own, tally);
 }
-
-CycleResult Install::Cycle(ProcessTally* tally) const { return RunLockedCycle(path(), Processor(tally)); }
 
 namespace {
 

@@ -34,11 +34,9 @@ class Install {
   // in, so a collector never sees half a file. Safe beside a running cycle.
   std::u16string DropAtomically(const std::u16string& name, const std::string& bytes) const;
 
-  // One cycle through the collector lock. Adds to `tally` when given.
-  CycleResult Cycle(ProcessTally* tally = nullptr) const;
-  // The processor the cycle hands each report folder to; `stored` (when given)
-  // grows by the rows stored, after each call.
-  AlertFileProcessor Processor(ProcessTally* tally, std::atomic<uint64_t>* stored = nullptr) const;
+  // One cycle through the collector lock, as the library's thread runs it,
+  // in `cycle` when given. Adds to `tally` when given.
+  CycleResult Cycle(ProcessTally* tally = nullptr, CycleContext* cycle = nullptr) const;
 
   // "Alert Path" of every stored row, with its number of rows.
   std::map<std::u16string, int> RowsByPath() const;

@@ -83,11 +83,10 @@ TEST(Stress, ArrivingFilesWithCountsAndPurgesEndStoredOnceOrUnderTheirNames) {
   const Clock::time_point deadline = Clock::now() + run_for;
   std::atomic<uint64_t> stored_known{0};
   ProcessingThread* processing = ProcessingThread::Start(5, [&](const platform::StopSignal& stop) {
-    RunLockedCycle(install.path(), [&](StringList& files, const std::u16string& status, const std::u16string& component) {
-      ProcessTally tally;
-      ProcessAlertFiles(install.path(), files, status, component, &stop, &tally);
-      stored_known += tally.stored;
-    });
+    CycleContext cycle(&stop);
+    ProcessTally tally;
+    install.Cycle(&tally, &cycle);
+    stored_known += tally.stored;
   });
   ASSERT_NE(processing, nullptr);
 

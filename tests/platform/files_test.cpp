@@ -34,20 +34,32 @@ TEST(PlatformFiles, MoveNeverReplacesReadRefusesFoldersAndTheLockIsExclusive) {
   EXPECT_EQ(env.ReadFile(b, &bytes, 0).status, FileStatus::kTooLarge);
   EXPECT_EQ(env.ReadFile(dir.Join(u"missing"), &bytes, 10).status, FileStatus::kNotFound);
 
+  uint64_t size = 7;
+  EXPECT_TRUE(env.FileSize(b, &size).ok());
+  EXPECT_EQ(size, 1u);
+  EXPECT_EQ(env.FileSize(dir.Join(u"folder.eml"), &size).status, FileStatus::kIsFolder);
+  EXPECT_EQ(env.FileSize(dir.Join(u"missing"), &size).status, FileStatus::kNotFound);
+
   // The probe of the support tool's status sees a holder, takes nothing and
-  // creates no lock file.
+  // creates no lock file; a failed lock says why.
   const std::u16string lock = dir.Join(u"x.lock");
+  platform::FileResult failure;
   EXPECT_FALSE(env.FileLockHeld(lock));
   EXPECT_FALSE(env.PathExists(lock));
-  platform::FileLock first = env.TryLockFile(lock);
+  platform::FileLock first = env.TryLockFile(lock, &failure);
   ASSERT_NE(first, nullptr);
-  EXPECT_EQ(env.TryLockFile(lock), nullptr);
+  EXPECT_EQ(env.TryLockFile(lock, &failure), nullptr);
+  EXPECT_EQ(failure.status, FileStatus::kSharingViolation);
   EXPECT_TRUE(env.FileLockHeld(lock));
   env.UnlockFile(first);
   EXPECT_FALSE(env.FileLockHeld(lock));
-  first = env.TryLockFile(lock);
+  first = env.TryLockFile(lock, &failure);
   EXPECT_NE(first, nullptr) << "neither the probe nor the unlock left it taken";
   env.UnlockFile(first);
+  test::MakeFolders(dir.Join(u"folder.lock"));  // cannot be opened: no held lock
+  EXPECT_EQ(env.TryLockFile(dir.Join(u"folder.lock"), &failure), nullptr);
+  EXPECT_FALSE(failure.ok());
+  EXPECT_NE(failure.status, FileStatus::kSharingViolation);
 }
 
 TEST(PlatformFiles, ListFolderMatchesWildcardsIgnoringAsciiCase) {

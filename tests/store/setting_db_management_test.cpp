@@ -1,6 +1,7 @@
 #include "store/setting_db_management.h"
 
 #include "store/alert_table.h"
+#include "store/retention.h"
 #include "store_test_support.h"
 
 namespace asum {
@@ -52,7 +53,40 @@ TEST(OpenDB, CreatesTheTableOnlyWhereItIsMissing) {
   EXPECT_FALSE(CSettingDBManagement().OpenDB(dir.install() + platform::NativeSeparators(u"\\no\\such.db")));
 }
 
-// Seven attempts, each compiling the text afresh; ExecuteScalar makes one.
+// Two first callers on a fresh install both find no file; the second one's
+// CREATE TABLE then fails. Here the other caller makes file and table right
+// after this caller's look.
+class RacedFirstCall : public platform::Env {
+ public:
+  explicit RacedFirstCall(std::u16string db) : db_(std::move(db)) {}
+  bool PathExists(const std::u16string& path) override {
+    const bool exists = Env::PathExists(path);
+    if (path == db_ && !std::exchange(raced_, true)) {
+      EXPECT_EQ(test::RawConnection(db_).Exec(test::Narrow(CreateAlertTableSql()).c_str()), SQLITE_OK);
+    }
+    return exists;
+  }
+
+ private:
+  std::u16string db_;
+  bool raced_ = false;
+};
+
+TEST(OpenDB, TwoFirstCallersBothSucceed) {
+  for (bool purge : {false, true}) {
+    test::StoreDir dir;
+    CSettingDBManagement::GetAlertSummaryFolder(dir.install());
+    RacedFirstCall raced(dir.db_path());
+    platform::ScopedEnv scope(&raced);
+    EXPECT_EQ(purge ? DeleteOldAlerts(dir.install(), u"2001/01/01 00:00:00")
+                    : static_cast<int>(CSettingDBManagement().OpenDB(dir.db_path())), 1) << purge;
+    EXPECT_EQ(dir.Column().size(), 0u) << "the table is there";
+  }
+}
+
+// Seven attempts, each compiling the text afresh; ExecuteScalar makes one. A
+// statement that ran is kept for the same text, and compiled anew when a
+// schema change made it stale.
 TEST(ExecuteQuery, MakesSevenAttemptsAndLogsOnlyTheFirst) {
   test::StoreDir dir;
   dir.Create();
@@ -71,9 +105,13 @@ TEST(ExecuteQuery, MakesSevenAttemptsAndLogsOnlyTheFirst) {
   EXPECT_EQ(attempts([&] { EXPECT_FALSE(store.FillDatainDB(u"", u"", u"", u"", u"", u"", u"", u"", u"", u"", u"")); }),
             7u);
   EXPECT_EQ(attempts([&] { EXPECT_EQ(store.ExecuteScalar(u"SELECT count(*) FROM AlertDB"), u""); }), 1u);
-  EXPECT_EQ(log.Messages(), (Texts{u"Inside ExecuteQuery function - Status: success",
-                                   u"Inside ExecuteQuery function - Status: failure", u"Inside FillDatainDB function",
-                                   u"Inside ExecuteQuery function - Status: failure"}));
+  other.Exec("ROLLBACK");
+  EXPECT_EQ(attempts([&] { EXPECT_TRUE(store.ExecuteQuery(u"DELETE FROM AlertDB")); }), 0u);
+  ASSERT_EQ(other.Exec("CREATE TABLE other (x)"), SQLITE_OK);
+  EXPECT_EQ(attempts([&] { EXPECT_TRUE(store.ExecuteQuery(u"DELETE FROM AlertDB")); }), 1u);
+  const std::u16string ok = u"Inside ExecuteQuery function - Status: success";
+  EXPECT_EQ(log.Messages(), (Texts{ok, u"Inside ExecuteQuery function - Status: failure", u"Inside FillDatainDB function",
+                                   u"Inside ExecuteQuery function - Status: failure", ok, ok}));
 }
 
 TEST(FillDatainDB, ValuesLandInTheirColumns) {

@@ -29,15 +29,21 @@ int RunOnce(const std::u16string& install, bool first_creates) {
   if (first_creates) EnsureDatabase(install);
   Progress progress(Backlog(install));
   ProcessTally tally;
+  CycleContext cycle;
   const CycleResult result = RunLockedCycle(install, [&](StringList& files, const std::u16string& status,
                                                            const std::u16string& component) {
-    ProcessAlertFiles(install, files, status, component, nullptr, &tally);
+    ProcessAlertFiles(install, files, status, component, &cycle, &tally);
     progress.Advance(tally.stored + tally.marked + tally.left);
   });
   if (result == CycleResult::kBusy) {
     std::fprintf(stderr, "alertsummary: another collector (the service or another tool) is working on %s; "
                          "nothing was done\n", Utf8(install).c_str());
     return kExitBusy;
+  }
+  if (result == CycleResult::kNoLock) {
+    std::fprintf(stderr, "alertsummary: the collector lock %s cannot be created or opened; nothing was done\n",
+                 Utf8(CollectorLockPathOf(install)).c_str());
+    return kExitFailure;
   }
   if (result == CycleResult::kNotADatabase) {
     std::fprintf(stderr, "alertsummary: %s is not an alert database; no file was touched\n",

@@ -220,6 +220,15 @@ FileResult Env::ReadFile(const std::u16string& path, std::string* bytes, uint64_
   return {};
 }
 
+FileResult Env::FileSize(const std::u16string& path, uint64_t* size) {
+  *size = 0;
+  struct stat st;
+  if (::stat(ToNative(path).c_str(), &st) != 0) return FromErrno(errno);
+  if (S_ISDIR(st.st_mode)) return {FileStatus::kIsFolder, EISDIR};
+  *size = static_cast<uint64_t>(st.st_size);
+  return {};
+}
+
 FileResult Env::WriteFile(const std::u16string& path, std::string_view bytes) {
   const int fd = ::open(ToNative(path).c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0644);
   if (fd < 0) return FromErrno(errno);
@@ -246,10 +255,16 @@ bool Env::AppendExclusive(const std::u16string& path, std::string_view line, uin
   return ok;
 }
 
-FileLock Env::TryLockFile(const std::u16string& path) {
+FileLock Env::TryLockFile(const std::u16string& path, FileResult* failure) {
+  *failure = {};
   const int fd = ::open(ToNative(path).c_str(), O_RDWR | O_CREAT | O_NOFOLLOW | O_CLOEXEC, 0644);
-  if (fd < 0) return nullptr;
+  if (fd < 0) {
+    *failure = FromErrno(errno);
+    return nullptr;
+  }
   if (::flock(fd, LOCK_EX | LOCK_NB) != 0) {
+    const int err = errno;
+    *failure = err == EWOULDBLOCK ? FileResult{FileStatus::kSharingViolation, static_cast<uint32_t>(err)} : FromErrno(err);
     ::close(fd);
     return nullptr;
   }

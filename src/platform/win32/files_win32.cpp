@@ -68,6 +68,15 @@ FileResult Env::RemoveFile(const std::u16string& path) {
   return FromLastError(::GetLastError());
 }
 
+FileResult Env::FileSize(const std::u16string& path, uint64_t* size) {
+  *size = 0;
+  WIN32_FILE_ATTRIBUTE_DATA data;
+  if (!::GetFileAttributesExW(W(path), GetFileExInfoStandard, &data)) return FromLastError(::GetLastError());
+  if ((data.dwFileAttributes & FILE_ATTRIBUTE_DIRECTORY) != 0) return {FileStatus::kIsFolder, 0};
+  *size = (static_cast<uint64_t>(data.nFileSizeHigh) << 32) | data.nFileSizeLow;
+  return {};
+}
+
 FileResult Env::ReadFile(const std::u16string& path, std::string* bytes, uint64_t max_bytes) {
   bytes->clear();
   // FILE_SHARE_READ only: while the service still writes the message, the open
@@ -160,12 +169,18 @@ bool Env::AppendExclusive(const std::u16string& path, std::string_view line, uin
   return ok;
 }
 
-FileLock Env::TryLockFile(const std::u16string& path) {
+FileLock Env::TryLockFile(const std::u16string& path, FileResult* failure) {
+  *failure = {};
   HANDLE file = ::CreateFileW(W(path), GENERIC_READ | GENERIC_WRITE, FILE_SHARE_READ | FILE_SHARE_WRITE | FILE_SHARE_DELETE,
                               nullptr, OPEN_ALWAYS, FILE_ATTRIBUTE_NORMAL, nullptr);
-  if (file == INVALID_HANDLE_VALUE) return nullptr;
+  if (file == INVALID_HANDLE_VALUE) {
+    *failure = FromLastError(::GetLastError());
+    return nullptr;
+  }
   OVERLAPPED at = {};
   if (!::LockFileEx(file, LOCKFILE_EXCLUSIVE_LOCK | LOCKFILE_FAIL_IMMEDIATELY, 0, 1, 0, &at)) {
+    // ERROR_LOCK_VIOLATION: another holder has it.
+    *failure = FromLastError(::GetLastError());
     ::CloseHandle(file);
     return nullptr;
   }
