@@ -55,53 +55,48 @@ class RetentionTest : public ::testing::Test {
   test::StoreDir dir_;
 };
 
-TEST_F(RetentionTest, DaySettingDecidesWhatStays) {
+// "Sch_Retention" must be exactly "TRUE"; "Sch_Retention_Val" (default
+// "15 Days") counts back from today. Reading creates the keys on the way,
+// and closes every key it opened.
+TEST_F(RetentionTest, SettingsDecideWhatStays) {
   const auto& w = kWhens;
-  const std::pair<const char16_t*, Texts> cases[] = {
-      {nullptr, {w[2], w[4], w[5]}}, {u"15 Days", {w[2], w[4], w[5]}}, {u"0 Days", {w[5]}}, {u"no digits", {w[5]}},
-      {u"-5 Days", {}},              {u"99999999 Days", {w[0], w[1], w[2], w[4], w[5]}},  // -1/-1/-1 00:00:00
+  const struct {
+    const char16_t *on, *days;
+    Texts left;
+  } cases[] = {
+      {u"TRUE", nullptr, {w[2], w[4], w[5]}}, {u"TRUE", u"15 Days", {w[2], w[4], w[5]}}, {u"TRUE", u"0 Days", {w[5]}},
+      {u"TRUE", u"no digits", {w[5]}},        {u"TRUE", u"-5 Days", {}},
+      {u"TRUE", u"99999999 Days", {w[0], w[1], w[2], w[4], w[5]}},  // cut-off -1/-1/-1 00:00:00
+      {nullptr, u"-5 Days", w}, {u"", u"-5 Days", w}, {u"true", u"-5 Days", w}, {u"TRUE ", u"-5 Days", w},
   };
-  env_.SetSetting(u"Sch_Retention", u"TRUE");
-  for (const auto& [value, left] : cases) {
+  for (const auto& c : cases) {
     Reset();
-    env_.SetSetting(u"Sch_Retention_Val", value);
-    EXPECT_EQ(RunRetentionForHost(), 1);
-    EXPECT_EQ(dir_.Column(), left) << (value ? test::Narrow(value) : "default");
-  }
-}
-
-// Only "TRUE" switches the purge on; the keys on the way are created and
-// every key opened is closed again.
-TEST_F(RetentionTest, OnlyExactlyTrueSwitchesItOn) {
-  env_.SetSetting(u"Sch_Retention_Val", u"-5 Days");
-  for (const char16_t* value : {u"", u"true", u"True", u"TRUE ", u"FALSE", u"TRUE"}) {
-    env_.SetSetting(u"Sch_Retention", value);
-    const bool on = std::u16string(value) == u"TRUE";
-    EXPECT_EQ(RunRetentionProc(dir_.install()), on ? 1 : 0) << test::Narrow(value);
-    EXPECT_EQ(dir_.Column().size(), on ? 0u : kWhens.size()) << test::Narrow(value);
+    env_.SetSetting(u"Sch_Retention", c.on);
+    env_.SetSetting(u"Sch_Retention_Val", c.days);
+    const std::string name = test::Narrow(c.on ? c.on : u"-") + " " + test::Narrow(c.days ? c.days : u"-");
+    EXPECT_EQ(RunRetentionForHost(), c.left == w ? 0 : 1) << name;
+    EXPECT_EQ(dir_.Column(), c.left) << name;
   }
   const std::u16string suite = u"software\\Varnholt Suite\\Varnholt Suite";
   EXPECT_EQ(env_.keys, (std::set<std::u16string>{u"software", u"software\\Varnholt Suite", suite,
                                                  suite + u"\\Sch_Retention", suite + u"\\Sch_Retention_Val"}));
   EXPECT_EQ(env_.open_keys, 0);
-  Reset();
   env_.keys.clear();  // no "software": nothing is created, and the default leaves the purge off
-  EXPECT_EQ(RunRetentionProc(dir_.install()), 0);
+  EXPECT_EQ(RunRetentionForHost(), 0);
   EXPECT_TRUE(env_.keys.empty());
-  EXPECT_EQ(dir_.Column().size(), kWhens.size());
 }
 
 // The support tool's status reads the settings where a person may only read:
 // it finds what the purge finds, and creates no key on the way.
 TEST_F(RetentionTest, ReadingForStatusCreatesNoKey) {
-  const std::u16string key = u"software\\Varnholt Suite\\Varnholt Suite\\Sch_Retention_Val";
-  for (const char16_t* value : {u"30 Days", u"", static_cast<const char16_t*>(nullptr)}) {
+  const std::u16string suite = u"software\\Varnholt Suite\\Varnholt Suite";
+  EXPECT_EQ(ReadRetentionSetting(u"Sch_Retention_Val", u"15 Days"), u"15 Days");
+  EXPECT_EQ(env_.keys, std::set<std::u16string>{u"software"});
+  env_.keys.insert({u"software\\Varnholt Suite", suite, suite + u"\\Sch_Retention_Val"});
+  for (const char16_t* value : {u"30 Days", u""}) {
     env_.SetSetting(u"Sch_Retention_Val", value);
-    if (value == nullptr) env_.keys.erase(key);
-    const std::u16string read = value ? value : u"15 Days";
-    EXPECT_EQ(ReadRetentionSetting(u"Sch_Retention_Val", u"15 Days"), read);
-    EXPECT_EQ(env_.keys.count(key), value ? 1u : 0u) << "reading creates no key";
-    EXPECT_EQ(GetRetentionSetting(u"Sch_Retention_Val", u"15 Days"), read);
+    EXPECT_EQ(ReadRetentionSetting(u"Sch_Retention_Val", u"15 Days"), value);
+    EXPECT_EQ(GetRetentionSetting(u"Sch_Retention_Val", u"15 Days"), value);
   }
   EXPECT_EQ(env_.open_keys, 0);
 }
@@ -136,10 +131,6 @@ TEST_F(RetentionTest, HostQueriesUseTheDatabaseBesideTheHost) {
   EXPECT_EQ(GetAlertCountForHost(nullptr, L"</FROM>"), 6);
   EXPECT_EQ(GetAlertCountForHost(L"t", L"<TO>2024/03/05 00:00:00</FROM><TO>2024/03/20 00:00:00</TO>"), 3);
   EXPECT_EQ(GetAlertCountForHost(L"</FROM>", L"t"), 0) << "swapped arguments are another request";
-  EXPECT_EQ(RunRetentionForHost(), 0);
-  env_.SetSetting(u"Sch_Retention", u"TRUE");
-  EXPECT_EQ(RunRetentionForHost(), 1);
-  EXPECT_EQ(dir_.Column().size(), 3u);
 }
 
 }  // namespace

@@ -57,7 +57,7 @@ class UnwritableFile {
 
 // Today is 2024-03-20 13:45; the settings are a registry in memory whose keys
 // are paths below HKEY_LOCAL_MACHINE ("software\Varnholt Suite"), a value at
-// its key's path, "\" and its name. SetSetting makes the keys on the way.
+// its key's path, "\" and its name.
 class StoreEnv : public platform::Env {
  public:
   std::u16string executable;
@@ -67,9 +67,7 @@ class StoreEnv : public platform::Env {
 
   // Where the host writes a retention setting; null removes it.
   void SetSetting(const std::u16string& name, const char16_t* value) {
-    const std::u16string suite = u"software\\Varnholt Suite\\Varnholt Suite";
-    keys.insert({u"software", u"software\\Varnholt Suite", suite, suite + u"\\" + name});
-    const std::u16string path = suite + u"\\" + name + u"\\" + name;
+    const std::u16string path = u"software\\Varnholt Suite\\Varnholt Suite\\" + name + u"\\" + name;
     value ? void(values[path] = value) : void(values.erase(path));
   }
   platform::SystemTime LocalNow() override { return {2024, 3, 3, 20, 13, 45, 0, 0}; }
