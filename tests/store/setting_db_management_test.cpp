@@ -109,9 +109,9 @@ TEST(ExecuteQuery, MakesSevenAttemptsAndLogsOnlyTheFirst) {
   EXPECT_EQ(attempts([&] { EXPECT_TRUE(store.ExecuteQuery(u"DELETE FROM AlertDB")); }), 0u);
   ASSERT_EQ(other.Exec("CREATE TABLE other (x)"), SQLITE_OK);
   EXPECT_EQ(attempts([&] { EXPECT_TRUE(store.ExecuteQuery(u"DELETE FROM AlertDB")); }), 1u);
-  const std::u16string ok = u"Inside ExecuteQuery function - Status: success";
-  EXPECT_EQ(log.Messages(), (Texts{ok, u"Inside ExecuteQuery function - Status: failure", u"Inside FillDatainDB function",
-                                   u"Inside ExecuteQuery function - Status: failure", ok, ok}));
+  const std::u16string ok = u"Inside ExecuteQuery function - Status: success",
+                       failed = u"Inside ExecuteQuery function - Status: failure";
+  EXPECT_EQ(log.Messages(), (Texts{ok, failed, u"Inside FillDatainDB function", failed, ok, ok}));
 }
 
 TEST(FillDatainDB, ValuesLandInTheirColumns) {
