@@ -91,10 +91,10 @@ class StopAt : public platform::Env {
  public:
   enum class Where { kNowhere, kListing, kRename };
   StopAt(platform::StopSignal* stop, Where where) : stop_(stop), where_(where) {}
-  bool ListFolder(const std::u16string& folder, const std::u16string& wildcard,
-                  std::vector<platform::DirEntry>* out) override {
-    if (where_ == Where::kListing && wildcard == u"*.eml*") stop_->Request();
-    return Env::ListFolder(folder, wildcard, out);
+  bool ListFiles(const std::u16string& folder, const std::u16string& wildcard, std::string_view skip,
+                 std::vector<std::u16string>* out) override {
+    if (where_ == Where::kListing) stop_->Request();
+    return Env::ListFiles(folder, wildcard, skip, out);
   }
   platform::FileResult RenameNoReplace(const std::u16string& from, const std::u16string& to) override {
     if (where_ == Where::kRename) stop_->Request();

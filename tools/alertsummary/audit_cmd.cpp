@@ -334,18 +334,13 @@ Runner AddAudit(CLI::App& app) {
   return [options]() {
     const std::u16string install = ApplyCommonOptions(options->common, ServiceLog::kLeaveAlone);
     const InstallPaths paths = PathsOf(install);
-    platform::Env& env = platform::Current();
     platform::FileLock lock = nullptr;
     {
       CDbSQLite probe;
       OpenForReading(probe, paths.database);
     }
     if (options->fix) {
-      lock = env.TryLockFile(paths.lock);
-      if (lock == nullptr) {
-        throw ToolError(kExitBusy, "another collector (the service or another tool) is working on " + Utf8(install) +
-                                       "; nothing was done");
-      }
+      lock = TakeCollectorLock(install, paths.lock);
     }
     struct Unlock {
       platform::FileLock lock;

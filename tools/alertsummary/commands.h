@@ -8,6 +8,8 @@
 #include <stdexcept>
 #include <string>
 
+#include "platform/platform.h"
+
 namespace asum::tool {
 
 // Exit codes, for scripts.
@@ -63,6 +65,11 @@ std::u16string Utf16(const std::string& text);
 // A path as the library's platform layer spells it, so a Linux name that is
 // not UTF-8 still names its file.
 std::u16string PathText(const std::filesystem::path& path);
+
+// Takes the install folder's collector lock without waiting: ToolError with
+// exit 4 when another collector holds it, exit 1 when it cannot be had at all
+// (a read-only install folder), saying why.
+platform::FileLock TakeCollectorLock(const std::u16string& install, const std::u16string& lock_path);
 
 // A "YYYY/MM/DD hh:mm:ss" pair in the range text the host passes.
 std::u16string RangeText(const std::string& from, const std::string& to);

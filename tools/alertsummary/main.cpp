@@ -43,6 +43,18 @@ void AddCommonOptions(CLI::App& sub, CommonOptions& options, bool with_install_d
 
 std::u16string ServiceLogFolder() { return g_service_log_folder; }
 
+platform::FileLock TakeCollectorLock(const std::u16string& install, const std::u16string& lock_path) {
+  platform::FileResult failure;
+  platform::FileLock lock = platform::Current().TryLockFile(lock_path, &failure);
+  if (lock != nullptr) return lock;
+  if (failure.status == platform::FileStatus::kSharingViolation) {
+    throw ToolError(kExitBusy, "another collector (the service or another tool) is working on " + Utf8(install) +
+                                   "; nothing was done");
+  }
+  throw ToolError(kExitFailure, "the collector lock " + Utf8(lock_path) + " cannot be had: " +
+                                    Utf16ToUtf8(failure.Describe()) + "; nothing was done");
+}
+
 std::u16string ApplyCommonOptions(const CommonOptions& options, ServiceLog log) {
   namespace fs = std::filesystem;
   if (!options.log_dir.empty()) {

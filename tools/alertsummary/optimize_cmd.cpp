@@ -36,11 +36,7 @@ Runner AddOptimize(CLI::App& app) {
       if (!HasAlertTable(probe)) throw ToolError(kExitFailure, Utf8(paths.database) + " holds no alert table");
     }
     platform::Env& env = platform::Current();
-    platform::FileLock lock = env.TryLockFile(paths.lock);
-    if (lock == nullptr) {
-      throw ToolError(kExitBusy, "another collector (the service or another tool) is working on " + Utf8(install) +
-                                     "; nothing was done");
-    }
+    platform::FileLock lock = TakeCollectorLock(install, paths.lock);
     BusyBudget budget(kQueryBusyTimeoutMs);
     CDbSQLite db;
     db.SetBusyBudget(&budget);
