@@ -118,7 +118,7 @@ TEST_F(RetentionTest, UnusableDatabasesGiveZeroAndKeepTheirRows) {
   test::UnwritableFile file(dir_.db_path());
   if (!file.unwritable()) {
     GTEST_SKIP() << "neither read-only permissions nor the immutable attribute keep this user from writing here "
-                    "(chattr +i needs Linux, root and ext2/3/4, XFS or Btrfs; Wine as root writes read-only files)";
+                    "(chattr +i needs root and a file system that keeps it: ext2/3/4, XFS or Btrfs)";
   }
   EXPECT_EQ(CountAlerts(dir_.install(), u"", u"</FROM>"), 6) << "a read-only database is still counted";
   EXPECT_EQ(RunRetentionProc(dir_.install(), 20), 0);

@@ -3,7 +3,9 @@
 #include <filesystem>
 #include <fstream>
 
-#ifndef _WIN32
+#ifdef _WIN32
+#include <windows.h>
+#else
 #include <fcntl.h>
 #include <linux/fs.h>
 #include <sys/ioctl.h>
@@ -38,19 +40,22 @@ std::vector<std::u16string> StoreDir::Column(const char* expression) const {
 
 UnwritableFile::UnwritableFile(const std::u16string& path) : path_(path) {
   std::filesystem::permissions(std::filesystem::path(path_), std::filesystem::perms::owner_read);
-  if (!unwritable()) immutable_ = SetImmutable(true);
+  if (!unwritable()) locked_out_ = LockOut(true);
 }
 
 UnwritableFile::~UnwritableFile() {
-  if (immutable_) SetImmutable(false);
+  if (locked_out_) LockOut(false);
   std::filesystem::permissions(std::filesystem::path(path_), std::filesystem::perms::owner_all);
 }
 
 bool UnwritableFile::unwritable() const { return !std::ofstream(std::filesystem::path(path_), std::ios::app).good(); }
 
-bool UnwritableFile::SetImmutable(bool on) const {
+bool UnwritableFile::LockOut(bool on) {
 #ifdef _WIN32
-  return !on;
+  if (!on) return CloseHandle(handle_);
+  handle_ = CreateFileW(reinterpret_cast<const wchar_t*>(path_.c_str()), GENERIC_READ, FILE_SHARE_READ, nullptr,
+                        OPEN_EXISTING, FILE_ATTRIBUTE_NORMAL, nullptr);
+  return handle_ != INVALID_HANDLE_VALUE;
 #else
   const int fd = ::open(Narrow(path_).c_str(), O_RDONLY);
   int flags = 0;

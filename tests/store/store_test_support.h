@@ -42,7 +42,8 @@ class RawConnection {
 };
 
 // Makes a file unwritable for this user while it lives: read-only permissions,
-// or for root, whom they do not bind, the immutable attribute (chattr +i).
+// or where they do not bind (root) the immutable attribute of chattr +i on
+// Linux, and on Windows a handle that shares the file for reading alone.
 class UnwritableFile {
  public:
   explicit UnwritableFile(const std::u16string& path);
@@ -50,9 +51,10 @@ class UnwritableFile {
   bool unwritable() const;
 
  private:
-  bool SetImmutable(bool on) const;
+  bool LockOut(bool on);
   std::u16string path_;
-  bool immutable_ = false;
+  bool locked_out_ = false;
+  void* handle_ = nullptr;
 };
 
 // Today is 2024-03-20 13:45; the settings are a registry in memory whose keys
