@@ -1,7 +1,9 @@
 #include "collect/process_alerts.h"
 
+#include <algorithm>
 #include <condition_variable>
 #include <mutex>
+#include <vector>
 
 #include "collect/alert_message.h"
 #include "common/utf.h"
@@ -88,8 +90,7 @@ class LookAhead {
             const CycleContext& cycle)
       : files_(files), status_(status), component_(component), cycle_(cycle) {}
 
-  // Waits for the helper's file in hand (the stop request keeps it from
-  // starting another).
+  // Waits for the helper's file in hand; it starts no other.
   ~LookAhead() {
     if (thread_ == nullptr) return;
     std::unique_lock<std::mutex> lock(mutex_);

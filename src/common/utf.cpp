@@ -125,9 +125,14 @@ bool IsValidUtf8(std::string_view bytes) {
 }
 
 std::string Utf16ToUtf8(std::u16string_view utf16) {
-  std::string out;
-  out.reserve(utf16.size());
-  for (size_t i = 0; i < utf16.size(); ++i) {
+  // Every path handed to the system comes through here, mostly all ASCII:
+  // that leading run is copied straight.
+  size_t i = 0;
+  while (i < utf16.size() && utf16[i] < 0x80) ++i;
+  std::string out(i, '\0');
+  for (size_t k = 0; k < i; ++k) out[k] = static_cast<char>(utf16[k]);
+  out.reserve(i + (utf16.size() - i) * 3);
+  for (; i < utf16.size(); ++i) {
     char32_t c = utf16[i];
     if (c >= 0xD800 && c <= 0xDBFF && i + 1 < utf16.size() && utf16[i + 1] >= 0xDC00 &&
         utf16[i + 1] <= 0xDFFF) {

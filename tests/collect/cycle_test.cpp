@@ -86,10 +86,10 @@ TEST_F(LockedCycleTest, ADatabaseLeftWithoutItsTableStoresAgain) {
   EXPECT_EQ(Names(), std::vector<std::u16string>{u"PROC_a.eml"});
 }
 
-// Asks for a stop when a report folder is listed, or when a file is renamed.
+// Asks for a stop when a report folder is listed or when a file is renamed.
 class StopAt : public platform::Env {
  public:
-  enum class Where { kNowhere, kListing, kRename };
+  enum class Where { kBefore, kListing, kRename, kNever };
   StopAt(platform::StopSignal* stop, Where where) : stop_(stop), where_(where) {}
   bool ListFiles(const std::u16string& folder, const std::u16string& wildcard, std::string_view skip,
                  std::vector<std::u16string>* out) override {
@@ -111,16 +111,15 @@ class StopAt : public platform::Env {
 TEST_F(LockedCycleTest, AStopIsSeenBeforeEachReportFolderTheDatabaseAndEachFile) {
   struct Case {
     StopAt::Where where;
-    bool stop_first;      // requested before the cycle starts
-    int stored;           // files of the cycle given their PROC_ name
-    int listings;         // report folders listed
-    int opens;            // "Inside OpenDB function" lines
+    int stored;    // files of the cycle given their PROC_ name
+    int listings;  // report folders listed
+    int opens;     // "Inside OpenDB function" lines
   };
   const Case cases[] = {
-      {StopAt::Where::kNowhere, true, 0, 0, 0},
-      {StopAt::Where::kListing, false, 0, 1, 0},
-      {StopAt::Where::kRename, false, 1, 1, 1},
-      {StopAt::Where::kNowhere, false, 3, 2, 2},
+      {StopAt::Where::kBefore, 0, 0, 0},
+      {StopAt::Where::kListing, 0, 1, 0},
+      {StopAt::Where::kRename, 1, 1, 1},
+      {StopAt::Where::kNever, 3, 2, 2},
   };
   for (const Case& c : cases) {
     SCOPED_TRACE(static_cast<int>(&c - cases));
@@ -132,7 +131,7 @@ TEST_F(LockedCycleTest, AStopIsSeenBeforeEachReportFolderTheDatabaseAndEachFile)
     EnsureDatabase(dir.path());
     test::CapturedLog log;
     platform::StopSignal stop;
-    if (c.stop_first) stop.Request();
+    if (c.where == StopAt::Where::kBefore) stop.Request();
     StopAt env(&stop, c.where);
     CycleContext cycle(&stop);
     {
