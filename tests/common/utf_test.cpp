@@ -39,7 +39,7 @@ TEST(Utf8ToUtf16, EveryIllFormedKindBecomesReplacementCharacters) {
 TEST(Utf16Conversions, LoneSurrogatesAreReplaced) {
   const std::u16string lone = u"a\xD800" u"b\xDC80";
   EXPECT_EQ(Utf16ToUtf8(lone), "a\xEF\xBF\xBD" "b\xEF\xBF\xBD");
-  EXPECT_EQ(Utf16ToUtf8(u"\U0001F600"), "\xF0\x9F\x98\x80");
+  EXPECT_EQ(Utf16ToUtf8(u"caf\u00e9\u0080 \U0001F600"), "caf\xC3\xA9\xC2\x80 \xF0\x9F\x98\x80");
   EXPECT_EQ(DisplayText(lone), u"a\uFFFDb\uFFFD");
   EXPECT_EQ(NativeNameToBytes(u"\xDC41\xDCFF\xD800"), "\xEF\xBF\xBD\xFF\xEF\xBF\xBD");  // only 0x80-0xFF are bytes
   EXPECT_EQ(Utf32ToUtf16(U"a\U0001F600"), u"a\U0001F600");
