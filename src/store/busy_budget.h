@@ -23,6 +23,7 @@ inline constexpr uint32_t kProcessingBusyBudgetMs = 5000;
 class BusyBudget {
  public:
   explicit BusyBudget(uint32_t total_ms) : total_ms_(total_ms) {}
+  virtual ~BusyBudget() = default;
 
   uint32_t TotalMs() const { return total_ms_; }
   uint64_t SpentMs() const { return spent_ms_; }
@@ -31,8 +32,9 @@ class BusyBudget {
     return Exhausted() ? 0 : static_cast<uint32_t>(total_ms_ - spent_ms_);
   }
   // A wait that overran what was left is charged only that: the budget counts
-  // the waiting it granted, so what it spent never exceeds its total.
-  void Charge(uint64_t ms) { spent_ms_ = ms >= RemainingMs() ? total_ms_ : spent_ms_ + ms; }
+  // the waiting it granted, so what it spent never exceeds its total. Called
+  // after each wait; virtual so a test can act while a statement waits.
+  virtual void Charge(uint64_t ms) { spent_ms_ = ms >= RemainingMs() ? total_ms_ : spent_ms_ + ms; }
 
  private:
   uint32_t total_ms_;

@@ -97,6 +97,7 @@ bool CDbSQLite::Close() {
 std::unique_ptr<CSqlStatement> CDbSQLite::Statement(const std::u16string& sql) {
   std::unique_ptr<CSqlStatement> statement(new CSqlStatement(sql, this));
   live_.push_back(statement.get());
+  ++prepared_;
   return statement;
 }
 

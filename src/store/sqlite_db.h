@@ -58,6 +58,8 @@ class CDbSQLite {
   // text that does not compile (or no open connection) gives a statement whose
   // every step fails.
   std::unique_ptr<CSqlStatement> Statement(const std::u16string& sql);
+  // How many statements this object has prepared (retries show in it).
+  uint64_t StatementsPrepared() const { return prepared_; }
 
  private:
   friend class CSqlStatement;
@@ -68,6 +70,7 @@ class CDbSQLite {
 
   sqlite3* db_ = nullptr;
   BusyBudget* budget_ = nullptr;
+  uint64_t prepared_ = 0;
   std::vector<CSqlStatement*> live_;  // statements prepared here and not yet destroyed
 };
 

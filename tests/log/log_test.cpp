@@ -9,17 +9,43 @@
 namespace asum {
 namespace {
 
-using test::CapturedLog;
-using test::ReadText;
-using test::TempDir;
-using test::WriteText;
+// A clock whose timestamp text the test chooses ("" when it cannot be rendered).
+class StampEnv : public platform::Env {
+ public:
+  std::u16string stamp = u"07.12.2026 01:02:03";
+  std::u16string TimestampText(const platform::SystemTime&) override { return stamp; }
+};
 
-std::u16string LogPath(const CapturedLog& log) {
-  return log.folder() + platform::kPathSeparator + u"ErrorLog.txt";
+TEST(WriteLog, LinesAreStampTabMessageCrLfInCallOrder) {
+  test::CapturedLog log;
+  StampEnv env;
+  platform::ScopedEnv scoped(&env);
+  WriteLog(u"first");
+  WriteLog(u"");
+  WriteLog(u"a\nb\rc caf\u00e9 \u4e2d \U0001F600");
+  env.stamp.clear();
+  WriteLog(u"no clock");
+  EXPECT_EQ(test::ReadText(log.folder() + platform::NativeSeparators(u"\\ErrorLog.txt")),
+            "07.12.2026 01:02:03\tfirst\r\n07.12.2026 01:02:03\t\r\n"
+            "07.12.2026 01:02:03\ta\r\nb\rc caf\xe9 ? ?\r\nInvalid DateTime\tno clock\r\n");
+}
+
+TEST(WriteLog, FileIsEmptiedOnceItHoldsTheLimit) {
+  test::CapturedLog log;
+  StampEnv env;
+  platform::ScopedEnv scoped(&env);
+  const std::u16string path = log.folder() + platform::NativeSeparators(u"\\ErrorLog.txt");
+  const std::string line = "07.12.2026 01:02:03\tnext\r\n";
+  for (size_t size : {5266224, 5266225, 5266226}) {
+    test::WriteText(path, std::string(size, 'x'));
+    WriteLog(u"next");
+    const std::string text = test::ReadText(path);
+    EXPECT_EQ(text, size < 5266225 ? std::string(size, 'x') + line : line) << size;
+  }
 }
 
 TEST(WriteLog, AbsentFolderCreatesNothing) {
-  TempDir dir;
+  test::TempDir dir;
   const std::u16string previous = platform::LogFolder();
   platform::SetLogFolder(dir.Join(u"missing"));
   WriteLog(u"dropped");
@@ -27,46 +53,8 @@ TEST(WriteLog, AbsentFolderCreatesNothing) {
   EXPECT_TRUE(test::ListNames(dir.path()).empty());
 }
 
-TEST(WriteLog, LinesAppearInCallOrderWithTabAndCrLf) {
-  CapturedLog log;
-  WriteLog(u"first");
-  WriteLog(u"");
-  WriteLog(u"a\nb");
-  const std::string text = ReadText(LogPath(log));
-  // Each line: timestamp, TAB, message, CR LF; a line feed inside becomes CR LF.
-  size_t first = text.find("\tfirst\r\n");
-  size_t empty = text.find("\t\r\n", first);
-  size_t split = text.find("\ta\r\nb\r\n", empty);
-  EXPECT_NE(first, std::string::npos);
-  EXPECT_NE(empty, std::string::npos);
-  EXPECT_NE(split, std::string::npos);
-  EXPECT_EQ(text.find('\t'), first) << "the first line must be the first message";
-  EXPECT_EQ(log.Messages().size(), 4u);
-}
-
-TEST(WriteLog, CharactersAboveLatin1BecomeQuestionMarks) {
-  CapturedLog log;
-  WriteLog(u"caf\u00e9 \u4e2d \U0001F600!");
-  const std::string text = ReadText(LogPath(log));
-  EXPECT_NE(text.find("\tcaf\xe9 ? ?!\r\n"), std::string::npos);
-}
-
-TEST(WriteLog, SizeLimitEmptiesTheFileExactlyAtTheLimit) {
-  CapturedLog log;
-  const std::string filler = "x";
-  WriteText(LogPath(log), std::string(kLogSizeLimit - 1, 'x'));
-  WriteLog(u"kept");
-  EXPECT_EQ(ReadText(LogPath(log)).compare(0, kLogSizeLimit - 1, std::string(kLogSizeLimit - 1, 'x')), 0);
-
-  WriteText(LogPath(log), std::string(kLogSizeLimit, 'x'));
-  WriteLog(u"alone");
-  const std::string text = ReadText(LogPath(log));
-  EXPECT_EQ(text.find('x'), std::string::npos);
-  EXPECT_EQ(log.Messages(), std::vector<std::u16string>{u"alone"});
-}
-
 TEST(WriteLog, ConcurrentWritersNeverInterleaveALine) {
-  CapturedLog log;
+  test::CapturedLog log;
   const std::u16string a(200, u'a'), b(200, u'b');
   std::thread ta([&] { for (int i = 0; i < 200; ++i) WriteLog(a); });
   std::thread tb([&] { for (int i = 0; i < 200; ++i) WriteLog(b); });

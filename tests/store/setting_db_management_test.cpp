@@ -1,9 +1,5 @@
 #include "store/setting_db_management.h"
 
-#include <gtest/gtest.h>
-
-#include <algorithm>
-
 #include "store/alert_table.h"
 #include "store/retention.h"
 #include "store_test_support.h"
@@ -11,65 +7,50 @@
 namespace asum {
 namespace {
 
-using test::StoreDir;
+using Texts = std::vector<std::u16string>;
 
 TEST(AlertTable, CreateStatementIsExact) {
-  const std::u16string tabs(8, u'\t');
-  const std::u16string expected =
-      u"CREATE TABLE AlertDB (" + tabs + u" \"Alert Action\"\tTEXT NOT NULL," + tabs +
-      u" \"Alert Type\"\tTEXT NOT NULL," + tabs + u" \"Alert Name\"\tTEXT NOT NULL," + tabs +
-      u" \"When\"\tTEXT NOT NULL," + tabs + u" \"Threshold\"\tTEXT NOT NULL," + tabs + u" \"Who\"\tTEXT NOT NULL," +
-      tabs + u" \"Operation\"\tTEXT NOT NULL," + tabs + u" \"Component Name\"\tTEXT NOT NULL," + tabs +
-      u" \"EmailStatus\"\tTEXT NOT NULL," + tabs + u" \"Server Name\"\tTEXT NOT NULL," + tabs +
-      u" \"Alert Path\"\tTEXT NOT NULL)";
-  EXPECT_EQ(CreateAlertTableSql().size(), 411u);
+  std::u16string expected = u"CREATE TABLE AlertDB (";
+  for (const char16_t* column : {u"Alert Action", u"Alert Type", u"Alert Name", u"When", u"Threshold", u"Who",
+                                 u"Operation", u"Component Name", u"EmailStatus", u"Server Name", u"Alert Path"}) {
+    expected += std::u16string(8, u'\t') + u" \"" + column + u"\"\tTEXT NOT NULL,";
+  }
+  expected.back() = u')';
   EXPECT_EQ(CreateAlertTableSql(), expected);
+  EXPECT_EQ(expected.size(), 411u);
 }
 
 TEST(AlertSummaryFolder, JoinsAndCreatesOneLevel) {
   test::TempDir dir;
-  const std::u16string sep(1, platform::kPathSeparator);
-  EXPECT_EQ(CSettingDBManagement::GetAlertSummaryFolder(dir.path()), dir.path() + sep + u"Alert_Summary");
-  EXPECT_TRUE(platform::Current().PathExists(dir.path() + sep + u"Alert_Summary"));
-  EXPECT_EQ(CSettingDBManagement::GetAlertSummaryFolder(dir.path() + sep), dir.path() + sep + u"Alert_Summary");
-  // One level only: a missing parent is not created, and that is no error.
+  const std::u16string summary = dir.Join(u"Alert_Summary");
+  EXPECT_EQ(CSettingDBManagement::GetAlertSummaryFolder(dir.path() + platform::kPathSeparator), summary);
+  EXPECT_TRUE(platform::Current().PathExists(summary));
   EXPECT_EQ(CSettingDBManagement::GetAlertSummaryFolder(dir.Join(u"a\\b")), dir.Join(u"a\\b\\Alert_Summary"));
-  EXPECT_FALSE(platform::Current().PathExists(dir.Join(u"a")));
-  EXPECT_EQ(CSettingDBManagement::DatabasePath(u"F"), u"F" + sep + u"AlertSummaryDB.db");
+  EXPECT_FALSE(platform::Current().PathExists(dir.Join(u"a"))) << "one level only, and that is no error";
+  EXPECT_EQ(CSettingDBManagement::DatabasePath(u"F"), u"F" + platform::NativeSeparators(u"\\AlertSummaryDB.db"));
 }
 
-TEST(OpenDB, FirstOpenCreatesFileAndTableSecondOnlyOpens) {
+// A new file gets the table; an existing database gets only a missing table
+// (what a crash during the first creation leaves); a file that is no database
+// is opened and never touched.
+TEST(OpenDB, CreatesTheTableOnlyWhereItIsMissing) {
+  test::StoreDir dir;
+  const std::u16string path = dir.db_path();
+  const std::string junk = "not a database, not SQLite at all";
+  CSettingDBManagement::GetAlertSummaryFolder(dir.install());
   test::CapturedLog log;
-  StoreDir dir;
-  const std::u16string path = CSettingDBManagement::DatabasePath(CSettingDBManagement::GetAlertSummaryFolder(dir.install()));
-  {
+  for (const char* content : {"(new)", "", "(kept)", junk.c_str()}) {
+    if (*content != '(') test::WriteText(path, content);
     CSettingDBManagement store;
-    EXPECT_TRUE(store.OpenDB(path));
+    EXPECT_TRUE(store.OpenDB(path)) << content;
+    EXPECT_EQ(store.FillDatainDB(u"", u"", u"", u"", u"", u"", u"", u"", u"", u"", u""), content != junk) << content;
   }
-  EXPECT_EQ(dir.RowCount(), 0);
-  {
-    CSettingDBManagement store;
-    EXPECT_TRUE(store.OpenDB(path)) << "the table exists: a second CREATE would fail";
-    EXPECT_TRUE(store.CloseDB());
-  }
-  const auto messages = log.Messages();
-  ASSERT_EQ(messages.size(), 2u);
-  EXPECT_EQ(messages[0], u"Inside OpenDB function: " + path);
-}
-
-// The table is left alone in a file that already exists, even when empty.
-TEST(OpenDB, ExistingDatabaseWithoutTheTableGetsIt) {
-  StoreDir dir;
-  test::WriteText(dir.db_path(), "");  // what a crash during the first creation leaves
-  test::CapturedLog log;
-  CSettingDBManagement store;
-  EXPECT_TRUE(store.OpenDB(dir.db_path()));
-  EXPECT_TRUE(store.FillDatainDB(u"", u"", u"", u"", u"", u"", u"", u"", u"", u"", u""));
-  EXPECT_EQ(store.ExecuteScalar(u"SELECT count(*) FROM AlertDB"), u"1");
-  EXPECT_EQ(store.ExecuteScalar(u"SELECT sql FROM sqlite_master WHERE name = 'AlertDB'"), CreateAlertTableSql());
-  const auto messages = log.Messages();
-  EXPECT_EQ(std::count(messages.begin(), messages.end(), u"AlertDB table missing in " + dir.db_path() + u"; created it"),
-            1);
+  EXPECT_EQ(test::ReadText(path), junk);
+  const std::u16string open = u"Inside OpenDB function: " + path, fill = u"Inside FillDatainDB function";
+  const std::u16string ok = u"Inside ExecuteQuery function - Status: success";
+  EXPECT_EQ(log.Messages(), (Texts{open, fill, ok, open, u"AlertDB table missing in " + path + u"; created it", fill,
+                                   ok, open, fill, ok, open, fill, u"Inside ExecuteQuery function - Status: failure"}));
+  EXPECT_FALSE(CSettingDBManagement().OpenDB(dir.install() + platform::NativeSeparators(u"\\no\\such.db")));
 }
 
 // Two first callers on a fresh install both find no file; the second one's
@@ -80,10 +61,8 @@ class RacedFirstCall : public platform::Env {
   explicit RacedFirstCall(std::u16string db) : db_(std::move(db)) {}
   bool PathExists(const std::u16string& path) override {
     const bool exists = Env::PathExists(path);
-    if (path == db_ && !raced_) {
-      raced_ = true;
-      test::RawConnection other(db_);
-      EXPECT_EQ(other.Exec(test::Narrow(CreateAlertTableSql()).c_str()), SQLITE_OK);
+    if (path == db_ && !std::exchange(raced_, true)) {
+      EXPECT_EQ(test::RawConnection(db_).Exec(test::Narrow(CreateAlertTableSql()).c_str()), SQLITE_OK);
     }
     return exists;
   }
@@ -94,74 +73,63 @@ class RacedFirstCall : public platform::Env {
 };
 
 TEST(OpenDB, TwoFirstCallersBothSucceed) {
-  struct Case {
-    const char* caller;
-    int (*call)(const StoreDir& dir);
-  };
-  const Case cases[] = {
-      {"OpenDB", [](const StoreDir& dir) { return static_cast<int>(CSettingDBManagement().OpenDB(dir.db_path())); }},
-      {"purge", [](const StoreDir& dir) { return DeleteOldAlerts(dir.install(), u"2001/01/01 00:00:00"); }},
-  };
-  for (const Case& c : cases) {
-    SCOPED_TRACE(c.caller);
-    StoreDir dir;
+  for (bool purge : {false, true}) {
+    test::StoreDir dir;
     CSettingDBManagement::GetAlertSummaryFolder(dir.install());
     RacedFirstCall raced(dir.db_path());
     platform::ScopedEnv scope(&raced);
-    EXPECT_EQ(c.call(dir), 1);
-    EXPECT_EQ(dir.RowCount(), 0) << "the table is there";
+    EXPECT_EQ(purge ? DeleteOldAlerts(dir.install(), u"2001/01/01 00:00:00")
+                    : static_cast<int>(CSettingDBManagement().OpenDB(dir.db_path())), 1) << purge;
+    EXPECT_EQ(dir.Column().size(), 0u) << "the table is there";
   }
 }
 
-TEST(OpenDB, UnusableFilesFailWithoutCrashing) {
-  StoreDir dir;
-  test::WriteText(dir.db_path(), std::string(4096, 'j'));  // not a database
-  CSettingDBManagement store;
-  EXPECT_TRUE(store.OpenDB(dir.db_path())) << "opening reads nothing yet";
-  EXPECT_FALSE(store.ExecuteQuery(u"DELETE FROM AlertDB"));
-  EXPECT_EQ(store.ExecuteScalar(u"SELECT 1 FROM AlertDB"), u"");
-  EXPECT_FALSE(store.OpenDB(dir.folder() + platform::NativeSeparators(u"\\missing\\AlertSummaryDB.db")));
-}
-
-TEST(ExecuteQuery, LogsFirstOutcomeAndRetriesSevenTimesInAll) {
-  StoreDir dir;
+// Seven attempts, each compiling the text afresh; ExecuteScalar makes one. A
+// statement that ran is kept for the same text, and compiled anew when a
+// schema change made it stale.
+TEST(ExecuteQuery, MakesSevenAttemptsAndLogsOnlyTheFirst) {
+  test::StoreDir dir;
   dir.Create();
+  test::RawConnection other(dir.db_path());
   CSettingDBManagement store;
   ASSERT_TRUE(store.OpenDB(dir.db_path()));
   test::CapturedLog log;
-  EXPECT_TRUE(store.ExecuteQuery(u"DELETE FROM AlertDB"));
-  EXPECT_FALSE(store.ExecuteQuery(u"DELETE FROM nothing"));
-  // The same text again, after another program changed the schema: the
-  // statement kept from the first run is stale, and the run still succeeds.
-  EXPECT_TRUE(store.ExecuteQuery(u"DELETE FROM AlertDB"));
-  EXPECT_EQ(test::RawConnection(dir.db_path()).Exec("CREATE TABLE other (x)"), SQLITE_OK);
-  EXPECT_TRUE(store.ExecuteQuery(u"DELETE FROM AlertDB"));
-  EXPECT_EQ(log.Messages(), (std::vector<std::u16string>{ExecuteQueryStatusLine(true), ExecuteQueryStatusLine(false),
-                                                         ExecuteQueryStatusLine(true), ExecuteQueryStatusLine(true)}));
-  EXPECT_EQ(ExecuteQueryStatusLine(false), u"Inside ExecuteQuery function - Status: failure");
+  const auto attempts = [&](const auto& run) {
+    const uint64_t before = store.Connection().StatementsPrepared();
+    run();
+    return store.Connection().StatementsPrepared() - before;
+  };
+  EXPECT_EQ(attempts([&] { EXPECT_TRUE(store.ExecuteQuery(u"DELETE FROM AlertDB")); }), 1u);
+  EXPECT_EQ(attempts([&] { EXPECT_FALSE(store.ExecuteQuery(u"DELETE FROM nothing")); }), 7u);
+  ASSERT_EQ(other.Exec("BEGIN EXCLUSIVE"), SQLITE_OK);  // busy, and no allowance to wait
+  EXPECT_EQ(attempts([&] { EXPECT_FALSE(store.FillDatainDB(u"", u"", u"", u"", u"", u"", u"", u"", u"", u"", u"")); }),
+            7u);
+  EXPECT_EQ(attempts([&] { EXPECT_EQ(store.ExecuteScalar(u"SELECT count(*) FROM AlertDB"), u""); }), 1u);
+  other.Exec("ROLLBACK");
+  EXPECT_EQ(attempts([&] { EXPECT_TRUE(store.ExecuteQuery(u"DELETE FROM AlertDB")); }), 0u);
+  ASSERT_EQ(other.Exec("CREATE TABLE other (x)"), SQLITE_OK);
+  EXPECT_EQ(attempts([&] { EXPECT_TRUE(store.ExecuteQuery(u"DELETE FROM AlertDB")); }), 1u);
+  const std::u16string ok = u"Inside ExecuteQuery function - Status: success",
+                       failed = u"Inside ExecuteQuery function - Status: failure";
+  EXPECT_EQ(log.Messages(), (Texts{ok, failed, u"Inside FillDatainDB function", failed, ok, ok}));
 }
 
 TEST(FillDatainDB, ValuesLandInTheirColumns) {
-  StoreDir dir;
+  test::StoreDir dir;
   dir.Create();
   CSettingDBManagement store;
   ASSERT_TRUE(store.OpenDB(dir.db_path()));
-  // Alert path is the tenth parameter, server name the eleventh.
-  ASSERT_TRUE(store.FillDatainDB(u"Email Alert", u"Type", u"Name", u"2024/03/05 14:07:09", u"N\\A", u"Who",
-                                 u"Op", u"Comp", u"Delivered", u"P", u"S"));
-  // Quotes, a NUL and text beyond the BMP: stored, cut at the NUL.
-  ASSERT_TRUE(store.FillDatainDB(u"Script Alert", u"O'Brien's \"type\"", u"'; DROP TABLE AlertDB; --",
+  // Alert path is the tenth parameter, server name the eleventh; quotes are
+  // stored as they are, and a value ends at its NUL.
+  ASSERT_TRUE(store.FillDatainDB(u"Email Alert", u"Type", u"Name", u"2024/03/05 14:07:09", u"N\\A", u"Who", u"Op",
+                                 u"Comp", u"Delivered", u"P", u"S"));
+  ASSERT_TRUE(store.FillDatainDB(u"A", u"O'Brien's \"type\"", u"'; DROP TABLE AlertDB; --",
                                  std::u16string(u"2024\0junk", 9), u"", u"", u"", u"", u"", u"\U0001F600", u""));
-  ASSERT_TRUE(store.FillDatainDB(u"", u"", u"", u"", u"", u"", u"", u"", u"", u"", u""));
-  const auto rows = dir.Rows();
-  ASSERT_EQ(rows.size(), 3u);
-  EXPECT_EQ(rows[0], (std::vector<std::u16string>{u"Email Alert", u"Type", u"Name", u"2024/03/05 14:07:09", u"N\\A",
-                                                  u"Who", u"Op", u"Comp", u"Delivered", u"S", u"P"}));
-  EXPECT_EQ(rows[1][1], u"O'Brien's \"type\"");
-  EXPECT_EQ(rows[1][2], u"'; DROP TABLE AlertDB; --");
-  EXPECT_EQ(rows[1][3], u"2024");
-  EXPECT_EQ(rows[1][10], u"\U0001F600");
-  EXPECT_EQ(rows[2], std::vector<std::u16string>(11, u""));
+  EXPECT_EQ(dir.Column("\"Alert Action\"||'|'||\"Alert Type\"||'|'||\"Alert Name\"||'|'||\"When\"||'|'||\"Threshold\""
+                       "||'|'||\"Who\"||'|'||\"Operation\"||'|'||\"Component Name\"||'|'||\"EmailStatus\"||'|'||"
+                       "\"Server Name\"||'|'||\"Alert Path\""),
+            (Texts{u"Email Alert|Type|Name|2024/03/05 14:07:09|N\\A|Who|Op|Comp|Delivered|S|P",
+                   u"A|O'Brien's \"type\"|'; DROP TABLE AlertDB; --|2024|||||||\U0001F600"}));
 }
 
 }  // namespace

@@ -1,14 +1,10 @@
 #include "store/when_index.h"
 
-#include <gtest/gtest.h>
-
 #include "store/alert_count.h"
 #include "store_test_support.h"
 
 namespace asum {
 namespace {
-
-using test::StoreDir;
 
 constexpr char16_t kMarch[] = u"<TO>2024/03/01 00:00:00</FROM><TO>2024/03/31 23:59:59</TO>";
 
@@ -16,14 +12,13 @@ constexpr char16_t kMarch[] = u"<TO>2024/03/01 00:00:00</FROM><TO>2024/03/31 23:
 // use it through their statements as they stand and answer the same; it comes
 // and goes without touching the rows.
 TEST(WhenIndex, CountAndPurgeUseItAndAnswerTheSame) {
-  StoreDir dir;
-  dir.Create();
-  dir.Insert({{u"Email Alert", u"Disk", u"2024/02/29 23:59:59"},
+  test::StoreDir dir;
+  dir.Create({{u"Email Alert", u"Disk", u"2024/02/29 23:59:59"},
               {u"Email Alert", u"Disk", u"2024/03/01 00:00:00"},
               {u"Script Alert", u"Disk", u"2024/03/31 23:59:59"},
               {u"Email Alert", u"Disk", u"-1/-1/-1 -1:-1:-1"}});
   const int before = CountAlerts(dir.install(), u"Email Alert", kMarch);
-  const auto rows = dir.Rows();
+  const auto rows = dir.Column("\"Alert Action\" || \"When\"");
   CDbSQLite db;
   ASSERT_TRUE(db.Open(dir.db_path()));
   EXPECT_FALSE(HasWhenIndex(db));
@@ -31,23 +26,17 @@ TEST(WhenIndex, CountAndPurgeUseItAndAnswerTheSame) {
   for (int twice = 0; twice < 2; ++twice) EXPECT_TRUE(CreateWhenIndex(db));
   EXPECT_TRUE(HasWhenIndex(db));
 
-  const CountStatement count = BuildCountStatement(u"Email Alert", kMarch);
-  struct Case {
-    std::u16string sql;
-    std::vector<std::u16string> params;
-  } cases[] = {
-      {count.sql, count.params},
-      {u"DELETE FROM AlertDB WHERE \"When\" <= '2024/03/01 00:00:00';", {}},
-  };
-  for (const Case& c : cases) {
+  const CountStatement cases[] = {BuildCountStatement(u"Email Alert", kMarch),
+                                  {u"DELETE FROM AlertDB WHERE \"When\" <= '2024/03/01 00:00:00';", {}}};
+  for (const CountStatement& c : cases) {
     auto plan = db.Statement(u"EXPLAIN QUERY PLAN " + c.sql);
     for (size_t i = 0; i < c.params.size(); ++i) plan->BindText(static_cast<int>(i + 1), c.params[i]);
     std::u16string details;
     while (plan->NextRow()) details += plan->ValueString(3);
-    EXPECT_NE(details.find(kWhenIndexName), std::u16string::npos) << test::Narrow(c.sql) << ": " << test::Narrow(details);
+    EXPECT_NE(details.find(kWhenIndexName), std::u16string::npos) << test::Narrow(c.sql + u": " + details);
   }
   EXPECT_EQ(CountAlerts(dir.install(), u"Email Alert", kMarch), before);
-  EXPECT_EQ(dir.Rows(), rows);
+  EXPECT_EQ(dir.Column("\"Alert Action\" || \"When\""), rows);
   EXPECT_TRUE(DropWhenIndex(db));
   EXPECT_FALSE(HasWhenIndex(db));
 }

@@ -28,7 +28,7 @@ std::u16string FromPath(const fs::path& p) { return p.u16string(); }
 
 }  // namespace
 
-std::string Narrow(const std::u16string& text) { return Utf16ToUtf8(text); }
+std::string Narrow(std::u16string_view text) { return Utf16ToUtf8(text); }
 std::u16string U16(const std::string& utf8) { return Utf8ToUtf16(utf8); }
 
 TempDir::TempDir() {

@@ -49,7 +49,7 @@ class CapturedLog {
   std::u16string previous_;
 };
 
-std::string Narrow(const std::u16string& text);  // UTF-8, for messages
+std::string Narrow(std::u16string_view text);  // UTF-8, for messages
 std::u16string U16(const std::string& utf8);
 
 }  // namespace asum::test
