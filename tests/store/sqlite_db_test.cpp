@@ -68,26 +68,5 @@ TEST(CDbSQLite, CloseFinalizesLiveStatementsWhichThenFailSafely) {
   EXPECT_EQ(read->ValueString(0), u"a1");
 }
 
-// The support tool's readers open the store this way: nothing may come into
-// being and nothing may change, whatever statement runs.
-TEST(SqliteDbOpen, ReadOnlyOpenCreatesAndChangesNothing) {
-  test::TempDir dir;
-  const std::u16string path = dir.Join(u"t.db");
-  CDbSQLite db;
-  EXPECT_FALSE(db.OpenReadOnly(path));
-  EXPECT_FALSE(platform::Current().PathExists(path));
-  ASSERT_TRUE(db.Open(path));
-  ASSERT_TRUE(db.Statement(u"CREATE TABLE t (v TEXT)")->Execute());
-  ASSERT_TRUE(db.Statement(u"INSERT INTO t VALUES('a')")->Execute());
-  ASSERT_TRUE(db.OpenReadOnly(path));
-  for (const char16_t* change : {u"INSERT INTO t VALUES('b')", u"DELETE FROM t", u"CREATE INDEX i ON t (v)",
-                                 u"CREATE TABLE u (v TEXT)", u"PRAGMA user_version = 5"}) {
-    EXPECT_FALSE(db.Statement(change)->Execute()) << test::Narrow(change);
-  }
-  auto read = db.Statement(u"SELECT group_concat(v) || count(*) FROM t");
-  ASSERT_TRUE(read->NextRow());
-  EXPECT_EQ(read->ValueString(0), u"a1");
-}
-
 }  // namespace
 }  // namespace asum
