@@ -11,6 +11,7 @@
 
 set(AS_SQLITE_PACKAGE "better-sqlite3@12.9.0")
 set(AS_SQLITE_TGZ_NAME "better-sqlite3-12.9.0.tgz")
+set(AS_SQLITE_TGZ_URL "https://registry.npmjs.org/better-sqlite3/-/${AS_SQLITE_TGZ_NAME}")
 set(AS_SQLITE_TGZ_SHA256 "ad0e29650140c49d0335b1d356596aa8166f12b758f418a98446130e3278f250")
 set(AS_SQLITE_C_SHA256 "391855ddc7af04001364430884d263cbe8638f852c83865823a2d08358f6b87d")
 
@@ -36,13 +37,26 @@ function(as_fetch_sqlite_package out)
     endif()
   endif()
   if(NOT EXISTS "${tgz}")
-    find_program(NPM npm REQUIRED)
     message(STATUS "Fetching the SQLite amalgamation (${AS_SQLITE_PACKAGE}) into ${cache}")
-    execute_process(COMMAND ${NPM} pack ${AS_SQLITE_PACKAGE} --silent
-      WORKING_DIRECTORY "${cache}"
-      RESULT_VARIABLE npm_result OUTPUT_QUIET)
-    if(NOT npm_result EQUAL 0 OR NOT EXISTS "${tgz}")
-      message(FATAL_ERROR "npm pack ${AS_SQLITE_PACKAGE} failed (${npm_result})")
+    # npm honours the machine's registry settings (mirror, proxy); without it
+    # the tarball comes straight from the public registry. The hash decides.
+    find_program(NPM npm)
+    if(NPM)
+      execute_process(COMMAND ${NPM} pack ${AS_SQLITE_PACKAGE} --silent
+        WORKING_DIRECTORY "${cache}"
+        RESULT_VARIABLE fetch_result OUTPUT_QUIET)
+    endif()
+    if(NOT EXISTS "${tgz}")
+      file(DOWNLOAD "${AS_SQLITE_TGZ_URL}" "${tgz}.part" STATUS fetch_status TLS_VERIFY ON)
+      list(GET fetch_status 0 fetch_result)
+      if(fetch_result EQUAL 0)
+        file(RENAME "${tgz}.part" "${tgz}")
+      else()
+        file(REMOVE "${tgz}.part")
+      endif()
+    endif()
+    if(NOT EXISTS "${tgz}")
+      message(FATAL_ERROR "${AS_SQLITE_PACKAGE} could not be fetched with npm nor from ${AS_SQLITE_TGZ_URL}")
     endif()
     file(SHA256 "${tgz}" tgz_hash)
     if(NOT tgz_hash STREQUAL AS_SQLITE_TGZ_SHA256)

@@ -5,7 +5,7 @@
 set -euo pipefail
 
 packages=(
-  cmake ninja-build g++ pkg-config npm
+  cmake ninja-build g++ pkg-config
   sqlite3 libgtest-dev googletest
   libcli11-dev nlohmann-json3-dev
   g++-mingw-w64-x86-64-posix binutils-mingw-w64-x86-64
@@ -25,6 +25,10 @@ installed() { dpkg-query -W -f='${Status}' "$1" 2>/dev/null | grep -q "install o
 
 missing=()
 for p in "${packages[@]}"; do installed "$p" || missing+=("$p"); done
+# npm fetches the pinned SQLite package. Machines that carry Node.js from
+# another source than Debian's (whose nodejs conflicts with Debian's npm)
+# already have an npm of their own, so only the command is looked for.
+command -v npm >/dev/null || missing+=(npm)
 optional_missing=()
 for p in "${optional[@]}"; do installed "$p" || optional_missing+=("$p"); done
 
