@@ -5,6 +5,8 @@
 #include <algorithm>
 #include <atomic>
 #include <chrono>
+#include <cstdlib>
+#include <ctime>
 #include <filesystem>
 #include <fstream>
 
@@ -20,6 +22,19 @@ namespace {
 // beside them would add its lines. A test that reads the log captures it.
 const bool kServiceLogOff = [] {
   platform::SetLogFolder(u"");
+  return true;
+}();
+
+// Dates in the tests are written for UTC; a program run by hand, outside
+// ctest, must not read them in the machine's own zone.
+const bool kZoneIsUtc = [] {
+#ifdef _WIN32
+  _putenv_s("TZ", "UTC");
+  _tzset();
+#else
+  setenv("TZ", "UTC", 1);
+  tzset();
+#endif
   return true;
 }();
 
