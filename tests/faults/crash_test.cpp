@@ -1,6 +1,5 @@
 // A collector killed outright in the middle of a backlog, then started again:
-// every file is stored, only the file in flight may be stored twice, and the
-// database is sound.
+// every file is stored, only the file in flight may be stored twice.
 #ifndef _WIN32
 #include <signal.h>
 #include <sys/wait.h>
@@ -12,18 +11,18 @@
 namespace asum::test {
 namespace {
 
-// At its n-th rename (its row is stored by then) the collector says so on a
-// pipe and stops there until it is killed.
+// At its 20th rename (that file's row is stored by then) the collector says so
+// on a pipe and stays there until it is killed.
 struct StopAtRename : platform::Env {
-  StopAtRename(int fd, int n) : fd(fd), left(n) {}
+  explicit StopAtRename(int fd) : fd(fd) {}
   platform::FileResult RenameNoReplace(const std::u16string& from, const std::u16string& to) override {
-    if (--left == 0) {
+    while (++renames == 20) {
       if (write(fd, "k", 1) != 1) _exit(1);
-      for (;;) pause();
+      pause();
     }
     return Env::RenameNoReplace(from, to);
   }
-  int fd, left;
+  int fd, renames = 0;
 };
 
 TEST(Crash, KilledMidBacklogLosesNothingAndStoresAtMostOneFileTwice) {
@@ -34,27 +33,26 @@ TEST(Crash, KilledMidBacklogLosesNothingAndStoresAtMostOneFileTwice) {
     const gen::GeneratedAlert alert = gen::GenerateAlert(11, i, 3, false);
     paths.push_back(install.Drop(kSent, U16(alert.file_name), alert.bytes));
   }
-  int pipe_fds[2];
-  ASSERT_EQ(pipe(pipe_fds), 0);
+  int fds[2];
+  ASSERT_EQ(pipe(fds), 0);
   const pid_t child = fork();
   ASSERT_GE(child, 0);
   if (child == 0) {
-    StopAtRename stopping(pipe_fds[1], 20);
+    StopAtRename stopping(fds[1]);
     platform::ScopedEnv scoped(&stopping);
     RunProcessingCycle(install.path());
     _exit(0);
   }
-  close(pipe_fds[1]);
+  close(fds[1]);
   char said = 0;
-  EXPECT_EQ(read(pipe_fds[0], &said, 1), 1) << "the collector ended before its 20th rename";
-  close(pipe_fds[0]);
+  EXPECT_EQ(read(fds[0], &said, 1), 1) << "the collector ended before its 20th rename";
+  close(fds[0]);
   kill(child, SIGKILL);
   int status = 0;
   ASSERT_EQ(waitpid(child, &status, 0), child);
   ASSERT_TRUE(WIFSIGNALED(status));
 
-  // Restart: the killed process's collector lock went with it.
-  ASSERT_EQ(RunProcessingCycle(install.path()), CycleResult::kDone);
+  ASSERT_EQ(RunProcessingCycle(install.path()), CycleResult::kDone);  // its lock went with the killed process
   const std::vector<End> ends = EndsOf(install, paths);
   EXPECT_EQ(Count(ends, kStored) + Count(ends, kStoredTwice), 60);
   EXPECT_LE(Count(ends, kStoredTwice), 1);

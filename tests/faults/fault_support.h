@@ -20,43 +20,31 @@ namespace asum::test {
 
 inline constexpr char16_t kSent[] = u"Main Component\\AlertReports\\Sent items";
 
-class Install {
+class Install : public TempDir {
  public:
   Install() {  // the component and the database, so the first cycle does work
-    WriteText(dir_.Join(u"Main Component\\info.dat"), "marker");
-    MakeFolders(dir_.Join(kSent));
+    WriteText(Join(u"Main Component\\info.dat"), "marker");
     EnsureDatabase(path());
   }
-  const std::u16string& path() const { return dir_.path(); }
   std::u16string Drop(const std::u16string& folder, const std::u16string& name, const std::string& bytes) const {
-    WriteText(dir_.Join(folder + u"\\" + name), bytes);
-    return dir_.Join(folder + u"\\" + name);
-  }
-  // Written beside, then renamed in whole: safe beside a running cycle.
-  std::u16string DropAtomically(const std::u16string& name, const std::string& bytes) const {
-    const std::u16string temp = Drop(u"staging", name, bytes), target = dir_.Join(kSent + (u"\\" + name));
-    EXPECT_TRUE(platform::Env::Default().RenameNoReplace(temp, target).ok()) << Narrow(target);
-    return target;
+    WriteText(Join(folder + u"\\" + name), bytes);
+    return Join(folder + u"\\" + name);
   }
   // Runs one SQL text on a connection of its own: the first column of each row.
   std::vector<std::u16string> Sql(const std::string& sql) const {
     std::vector<std::u16string> column;
     sqlite3* db = nullptr;
     sqlite3_stmt* st = nullptr;
-    if (sqlite3_open16(DatabasePathOf(path()).c_str(), &db) || sqlite3_prepare_v2(db, sql.c_str(), -1, &st, nullptr)) {
+    if (sqlite3_open16(DatabasePathOf(path()).c_str(), &db) || sqlite3_prepare_v2(db, sql.c_str(), -1, &st, 0)) {
       ADD_FAILURE() << sql << ": " << sqlite3_errmsg(db);
     }
     while (st != nullptr && sqlite3_step(st) == SQLITE_ROW) {
-      const void* text = sqlite3_column_text16(st, 0);
-      column.emplace_back(text == nullptr ? u"" : static_cast<const char16_t*>(text));
+      column.emplace_back(static_cast<const char16_t*>(sqlite3_column_text16(st, 0)));
     }
     sqlite3_finalize(st);
     sqlite3_close(db);
     return column;
   }
-
- private:
-  TempDir dir_;
 };
 
 // Where each file ended; the integrity check is part of the reading.
@@ -68,14 +56,15 @@ inline std::vector<End> EndsOf(const Install& install, const std::vector<std::u1
   EXPECT_EQ(install.Sql("PRAGMA integrity_check"), std::vector<std::u16string>{u"ok"});
   std::vector<End> ends;
   for (const std::u16string& p : paths) {
-    const bool named = platform::Env::Default().PathExists(p), marked = platform::Env::Default().PathExists(ProcName(p));
+    platform::Env& env = platform::Env::Default();
+    const bool named = env.PathExists(p), marked = env.PathExists(ProcName(p));
     const int n = rows[p];
     ends.push_back(named ? (marked || n > 0 ? kHalfDone : kLeft) : !marked || n > 2 ? kHalfDone : End(n));
     if (ends.back() == kHalfDone) ADD_FAILURE() << Narrow(p) << ": " << marked << " marked, " << n << " row(s)";
   }
   return ends;
 }
-inline int Count(const std::vector<End>& ends, End end) { return static_cast<int>(std::count(ends.begin(), ends.end(), end)); }
+inline int Count(const std::vector<End>& ends, End end) { return std::count(ends.begin(), ends.end(), end); }
 
 // Leaves out the largest cases: ALERTSUMMARY_QUICK set, or Windows (run emulated here).
 inline bool QuickRun() {
