@@ -5,7 +5,6 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
-#include "alert_generator.h"
 #include "fault_support.h"
 
 namespace asum::test {
@@ -16,10 +15,8 @@ namespace {
 struct StopAtRename : platform::Env {
   explicit StopAtRename(int fd) : fd(fd) {}
   platform::FileResult RenameNoReplace(const std::u16string& from, const std::u16string& to) override {
-    while (++renames == 20) {
-      if (write(fd, "k", 1) != 1) _exit(1);
-      pause();
-    }
+    if (++renames == 20 && write(fd, "k", 1) == 1)
+      for (;;) pause();
     return Env::RenameNoReplace(from, to);
   }
   int fd, renames = 0;
@@ -28,11 +25,7 @@ struct StopAtRename : platform::Env {
 TEST(Crash, KilledMidBacklogLosesNothingAndStoresAtMostOneFileTwice) {
   CapturedLog log;
   Install install;
-  std::vector<std::u16string> paths;
-  for (uint32_t i = 0; i < 60; ++i) {
-    const gen::GeneratedAlert alert = gen::GenerateAlert(11, i, 3, false);
-    paths.push_back(install.Drop(kSent, U16(alert.file_name), alert.bytes));
-  }
+  const std::vector<std::u16string> paths = install.DropAlerts(0, 60);
   int fds[2];
   ASSERT_EQ(pipe(fds), 0);
   const pid_t child = fork();

@@ -7,11 +7,11 @@
 #include <sqlite3.h>
 
 #include <algorithm>
-#include <cstdlib>
 #include <map>
 #include <string>
 #include <vector>
 
+#include "alert_generator.h"
 #include "collect/cycle.h"
 #include "store/setting_db_management.h"
 #include "support/test_support.h"
@@ -29,6 +29,16 @@ class Install : public TempDir {
   std::u16string Drop(const std::u16string& folder, const std::u16string& name, const std::string& bytes) const {
     WriteText(Join(folder + u"\\" + name), bytes);
     return Join(folder + u"\\" + name);
+  }
+  // Generated alerts `from` to `to` - 1, spread over `folders` in turn; their paths.
+  std::vector<std::u16string> DropAlerts(uint32_t from, uint32_t to,
+                                         const std::vector<std::u16string>& folders = {kSent}) const {
+    std::vector<std::u16string> paths;
+    for (uint32_t i = from; i < to; ++i) {
+      const gen::GeneratedAlert alert = gen::GenerateAlert(7, i, 3, false);
+      paths.push_back(Drop(folders[i % folders.size()], U16(alert.file_name), alert.bytes));
+    }
+    return paths;
   }
   // Runs one SQL text on a connection of its own: the first column of each row.
   std::vector<std::u16string> Sql(const std::string& sql) const {
@@ -65,13 +75,5 @@ inline std::vector<End> EndsOf(const Install& install, const std::vector<std::u1
   return ends;
 }
 inline int Count(const std::vector<End>& ends, End end) { return std::count(ends.begin(), ends.end(), end); }
-
-// Leaves out the largest cases: ALERTSUMMARY_QUICK set, or Windows (run emulated here).
-inline bool QuickRun() {
-#ifdef _WIN32
-  return true;
-#endif
-  return std::getenv("ALERTSUMMARY_QUICK") != nullptr;
-}
 
 }  // namespace asum::test

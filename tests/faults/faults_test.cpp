@@ -1,11 +1,9 @@
-// Faults a deployment meets around the database. While one lasts, each file
-// is stored once or keeps its name without a row; once it is mended, the next
-// cycles store every file exactly once. (A file that is no database and renames
-// refused are the collector's own tests.)
+// Faults a deployment meets around the database (a file that is no database and
+// refused renames are the collector's tests). While one lasts, each file is
+// stored once or keeps its name without a row; once mended, each is stored once.
 #include <atomic>
 #include <functional>
 
-#include "alert_generator.h"
 #include "fault_support.h"
 
 namespace asum::test {
@@ -48,13 +46,12 @@ TEST(Faults, WhileAFaultLastsNoFileIsHalfDoneAndOnceMendedEachIsStoredOnce) {
        },
        [](const Install&) { g_page_limit = 0, sqlite3_cancel_auto_extension(kLimitPages); }, false},
 #ifndef _WIN32
-      // A small disk mounted over the database folder and filled to a few
-      // pages; the database goes back where it was before the disk goes.
+      // A small disk over the database folder, filled to a few pages; the database goes back after.
       {"disk full",
        [&](const Install& i) {
-         if (!Shell("mount -t tmpfs -o size=256k tmpfs " + summary(i) + " 2>/dev/null")) return false;
-         EnsureDatabase(i.path());
-         return Shell("cd " + summary(i) + " && (dd if=/dev/zero of=fill bs=4k 2>/dev/null; truncate -s -12K fill)");
+         return Shell("mount -t tmpfs -o size=256k tmpfs " + summary(i) + " 2>/dev/null") &&
+                (EnsureDatabase(i.path()),
+                 Shell("cd " + summary(i) + " && (dd if=/dev/zero of=fill bs=4k; truncate -s -12K fill) 2>/dev/null"));
        },
        [&](const Install& i) {
          EXPECT_TRUE(Shell("cd " + summary(i) + " && cp AlertSummaryDB.db ../db && cd .. && umount " + summary(i) +
@@ -63,18 +60,14 @@ TEST(Faults, WhileAFaultLastsNoFileIsHalfDoneAndOnceMendedEachIsStoredOnce) {
        false},
 #endif
   };
-  const std::u16string folders[] = {kSent, u"Main Component\\AlertReports\\Outbox",
-                                    u"Second\\AlertReports\\Sent items", u"Second\\AlertReports\\Outbox"};
+  const std::vector<std::u16string> folders = {kSent, u"Main Component\\AlertReports\\Outbox",
+                                               u"Second\\AlertReports\\Sent items", u"Second\\AlertReports\\Outbox"};
   for (const Fault& f : faults) {
     SCOPED_TRACE(f.name);
     CapturedLog log;
     Install install;
     install.Drop(u"Second", u"info.dat", "");
-    std::vector<std::u16string> paths;
-    for (uint32_t i = 0; i < 40; ++i) {
-      const gen::GeneratedAlert alert = gen::GenerateAlert(3, i, 3, false);
-      paths.push_back(install.Drop(folders[i % 4], U16(alert.file_name), alert.bytes));
-    }
+    const std::vector<std::u16string> paths = install.DropAlerts(0, 40, folders);
     if (!f.make(install)) {
       std::cout << f.name << ": this machine cannot make the fault (a mount needs root)\n";
       continue;

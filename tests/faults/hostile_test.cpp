@@ -11,34 +11,32 @@
 namespace asum::test {
 namespace {
 
-std::string Repeat(const std::string& piece, size_t times) {
-  std::string text;
-  while (times-- > 0) text += piece;
-  return text;
-}
-
 TEST(HostileFiles, EachReachesItsEndInACycleOnASmallStack) {
   const std::string head =
       "From: \"Alert Service\" <alerts@corp.example>\r\nDate: Mon, 11 Jun 2026 09:05:03 +0000\r\nSubject: Script "
       "Execution Alert: Account Unlock \"Unlock\" (SRV01\\Account Lockout Report\\Daily)\r\n";
   const std::string html = "Content-Type: text/html\r\n\r\n<p><b>Who  :</b>CORP\\someone</p>";
+  const auto Repeat = [](const std::string& piece, int times) {
+    std::string t;
+    while (times-- > 0) t += piece;
+    return t;
+  };
   std::string junk(64 * 1024, '\0'), nested;
   for (size_t i = 0; i < junk.size(); ++i) junk[i] = static_cast<char>(i * 2654435761u >> 13);
   for (int i = 0; i < 3000; ++i) {  // multipart in multipart, each with a boundary of its own
-    nested += "Content-Type: multipart/mixed; boundary=\"b" + std::to_string(i) + "\"\r\n\r\n--b" +
-              std::to_string(i) + "\r\n";
+    nested += "Content-Type: multipart/mixed; boundary=\"b" + std::to_string(i) + "\"\r\n\r\n--b" + std::to_string(i) +
+              "\r\n";
   }
   struct Hostile {
     const char16_t* name;
     std::string bytes;
     End end;
   };
-  std::vector<Hostile> files = {
+  const std::vector<Hostile> files = {
       {u"control.eml", head + html, kStored},
       {u"zero_bytes.eml", "", kMarked},
       {u"binary_junk.eml", junk, kMarked},
       {u"nul_in_body.eml", head + html + std::string("\0after", 6) + junk.substr(0, 512), kStored},
-      {u"headers_only.eml", head + "Content-Type: text/html\r\n", kMarked},
       {u"huge_header.eml", head + "X-Pad: " + std::string(4 << 20, 'a') + "\r\n" + html, kStored},
       {u"many_headers.eml", head + Repeat("X-H: v\r\n", 200000) + html, kStored},
       {u"folded_forever.eml", head + "X-Folded: a" + Repeat("\r\n continued", 100000) + "\r\n" + html, kStored},
@@ -46,18 +44,11 @@ TEST(HostileFiles, EachReachesItsEndInACycleOnASmallStack) {
       {u"deep_tables.eml", head + html + Repeat("<table><tr><td>", 20000) + Repeat("</td></tr></table>", 20000),
        kStored},
       {u"bad_base64.eml", head + "Content-Transfer-Encoding: base64\r\n" + html + "!!==@@" + junk, kStored},
-      {u"junk_headers.eml", "From: =?utf-8?B?##?= <>\r\nSubject: =?bogus?Q?=FF?= =?utf-8?B?\r\nDate: no\r\n" + html,
-       kMarked},
       {u"no_line_ends.eml", std::string(2 << 20, 'z'), kMarked},
-      {u"unclassified.eml", "From: a@b.c\r\nSubject: just a note\r\n" + html, kMarked},
       {u"Alerte \u00e9t\u00e9 \u65e5\u672c \U0001F6A8.eml", head + html, kStored},
-      {u"name.eml.bak", head + html, kStored},
+      {u"twenty_megabytes.eml", head + html + "<table>" + Repeat("<tr><td>CORP\\a</td><td>\\\\FS\\f</td></tr>", 600000),
+       kStored},
   };
-  if (!QuickRun()) {
-    files.push_back({u"hundred_megabytes.eml", head + html + "<table>" +
-                         Repeat("<tr><td>CORP\\someone</td><td>\\\\FS01\\share\\file.txt</td></tr>\r\n", 1700000),
-                     kStored});
-  }
   CapturedLog log;
   Install install;
   std::vector<std::u16string> paths;
