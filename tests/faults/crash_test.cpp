@@ -33,8 +33,7 @@ TEST(Crash, KilledMidBacklogLosesNothingAndStoresAtMostOneFileTwice) {
   if (child == 0) {
     StopAtRename stopping(fds[1]);
     platform::ScopedEnv scoped(&stopping);
-    RunProcessingCycle(install.path());
-    _exit(0);
+    _exit(static_cast<int>(RunProcessingCycle(install.path())));
   }
   close(fds[1]);
   char said = 0;

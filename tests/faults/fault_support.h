@@ -1,6 +1,5 @@
-// An install folder for the whole-system fault tests: one component, alert
-// files dropped into its report folders, and what became of them read back
-// on connections of the test's own.
+// An install folder for the whole-system fault tests: one component, alert files
+// dropped into its report folders, and what became of them, read on connections of its own.
 #pragma once
 
 #include <gtest/gtest.h>
@@ -45,9 +44,8 @@ class Install : public TempDir {
     std::vector<std::u16string> column;
     sqlite3* db = nullptr;
     sqlite3_stmt* st = nullptr;
-    if (sqlite3_open16(DatabasePathOf(path()).c_str(), &db) || sqlite3_prepare_v2(db, sql.c_str(), -1, &st, 0)) {
-      ADD_FAILURE() << sql << ": " << sqlite3_errmsg(db);
-    }
+    sqlite3_open16(DatabasePathOf(path()).c_str(), &db);
+    if (sqlite3_prepare_v2(db, sql.c_str(), -1, &st, nullptr) != SQLITE_OK) ADD_FAILURE() << sql << sqlite3_errmsg(db);
     while (st != nullptr && sqlite3_step(st) == SQLITE_ROW) {
       column.emplace_back(static_cast<const char16_t*>(sqlite3_column_text16(st, 0)));
     }

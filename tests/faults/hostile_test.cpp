@@ -1,6 +1,7 @@
 // Hostile alert files through a real cycle on a small stack: nothing crashes,
 // the cycle ends, and each file reaches the end the processing rules give it.
 #include <functional>
+#include <tuple>
 
 #ifndef _WIN32
 #include <pthread.h>
@@ -27,12 +28,8 @@ TEST(HostileFiles, EachReachesItsEndInACycleOnASmallStack) {
     nested += "Content-Type: multipart/mixed; boundary=\"b" + std::to_string(i) + "\"\r\n\r\n--b" + std::to_string(i) +
               "\r\n";
   }
-  struct Hostile {
-    const char16_t* name;
-    std::string bytes;
-    End end;
-  };
-  const std::vector<Hostile> files = {
+  const std::vector<std::tuple<const char16_t*, std::string, End>> files = {
+      // name, bytes, end
       {u"control.eml", head + html, kStored},
       {u"zero_bytes.eml", "", kMarked},
       {u"binary_junk.eml", junk, kMarked},
@@ -52,7 +49,7 @@ TEST(HostileFiles, EachReachesItsEndInACycleOnASmallStack) {
   CapturedLog log;
   Install install;
   std::vector<std::u16string> paths;
-  for (const Hostile& f : files) paths.push_back(install.Drop(kSent, f.name, f.bytes));
+  for (const auto& [name, bytes, end] : files) paths.push_back(install.Drop(kSent, name, bytes));
   install.Drop(kSent, u"folder.eml\\inside", "");
   ProcessTally tally;
   std::function<void()> cycle = [&] { EXPECT_EQ(RunProcessingCycle(install.path(), &tally), CycleResult::kDone); };
@@ -68,7 +65,7 @@ TEST(HostileFiles, EachReachesItsEndInACycleOnASmallStack) {
 #endif
 
   const std::vector<End> ends = EndsOf(install, paths);
-  for (size_t i = 0; i < files.size(); ++i) EXPECT_EQ(ends[i], files[i].end) << Narrow(files[i].name);
+  for (size_t i = 0; i < files.size(); ++i) EXPECT_EQ(ends[i], std::get<2>(files[i])) << Narrow(std::get<0>(files[i]));
   EXPECT_EQ(tally.left, 0u) << "a folder named like an alert is not listed";
 }
 
