@@ -3,6 +3,7 @@
 // stored once or keeps its name without a row; once mended, each is stored once.
 #include <atomic>
 #include <functional>
+#include <iostream>
 
 #include "fault_support.h"
 
@@ -69,7 +70,10 @@ TEST(Faults, WhileAFaultLastsNoFileIsHalfDoneAndOnceMendedEachIsStoredOnce) {
     Install install;
     install.Drop(u"Second", u"info.dat", "");
     const std::vector<std::u16string> paths = install.DropAlerts(0, 40, folders);
-    if (!f.make(install)) continue;  // only root may mount a disk
+    if (!f.make(install)) {  // only root may mount a disk
+      std::cout << "skipped \"" << f.name << "\": this machine cannot make that fault\n";
+      continue;
+    }
     CycleContext cycle(nullptr, 100);
     EXPECT_EQ(RunProcessingCycle(install.path(), nullptr, &cycle), CycleResult::kDone);
     f.mend(install);
