@@ -18,20 +18,6 @@ StringList Sorted(StringList list) {
   return list;
 }
 
-TEST(GetComponentFolders, ASubfolderHoldingAMarkerIsAComponentFolder) {
-  test::TempDir dir;
-  for (const char16_t* file : {u"A\\info.dat", u"B\\info_SP.dat", u"C\\info_SS.dat", u"Web\\Web.dat", u"E\\info_FSA.dat",
-                               u"Plain\\other.dat", u"Other\\Web.dat", u"info.dat"}) {
-    test::WriteText(dir.Join(file), "");
-  }
-  test::MakeFolders(dir.Join(u"F\\info.dat"));  // a folder of a marker's name counts too
-  StringList components;
-  GetComponentFolders(dir.path(), components);
-  GetComponentFolders(u"", components);
-  GetComponentFolders(dir.Join(u"missing"), components);
-  EXPECT_EQ(Sorted(components), (StringList{u"A", u"B", u"C", u"E", u"F", u"Web"}));
-}
-
 // "*.eml*" in any case, files only, no "PROC_" (with case) anywhere in the
 // path, and nothing when the search pattern would not fit the search's buffer.
 TEST(GetDomainFolders, ListsTheUnprocessedAlertFiles) {
@@ -64,13 +50,15 @@ TEST(GetDomainFolders, ListsTheUnprocessedAlertFiles) {
   }
 }
 
-// Marker folders first, then the fixed names in their order; a fixed name
-// that holds a marker is walked twice, and its second walk finds what the
-// first left. Sent items before Outbox; empty lists are not handed on.
+// A subfolder holding a marker file (or a folder of its name) is a component
+// folder. Marker folders come first, then the fixed names in their order; a
+// fixed name that holds a marker is walked twice, and its second walk finds
+// what the first left. Sent items before Outbox; empty lists are not handed on.
 TEST(RunCollectionCycle, HandsEachReportFolderOnInOrderWithItsStatusAndComponent) {
   test::CapturedLog log;
   test::TempDir dir;
-  for (const char16_t* file : {u"Comp\\info.dat", u"Empty\\info.dat", u"NoReports\\info.dat", u"info.dat",
+  for (const char16_t* file : {u"Comp\\info.dat", u"Empty\\info_SP.dat", u"B\\info_SS.dat", u"Web\\Web.dat",
+                               u"E\\info_FSA.dat", u"Plain\\other.dat", u"Other\\Web.dat", u"info.dat",
                                u"Anomaly Alerts\\info.dat", u"Comp\\AlertReports\\Sent items\\s.eml",
                                u"Comp\\AlertReports\\Outbox\\o.eml", u"Anomaly Alerts\\AlertReports\\Sent items\\n.eml",
                                u"Predefine Alerts\\AlertReports\\Sent items\\p.eml",
@@ -78,6 +66,7 @@ TEST(RunCollectionCycle, HandsEachReportFolderOnInOrderWithItsStatusAndComponent
     test::WriteText(dir.Join(file), "");
   }
   test::MakeFolders(dir.Join(u"Empty\\AlertReports\\Outbox"));
+  test::MakeFolders(dir.Join(u"F\\info.dat"));
   Lines calls, anomaly;
   RunCollectionCycle(dir.path(), [&](StringList& files, const std::u16string& status, const std::u16string& component) {
     for (const auto& f : files) {
@@ -99,7 +88,7 @@ TEST(RunCollectionCycle, HandsEachReportFolderOnInOrderWithItsStatusAndComponent
   const std::u16string listed = u"After calling GetDomainFolders Function: ";
   const auto at = std::find(lines.begin(), lines.end(), u"Anomaly Alerts");
   ASSERT_LT(at + 2, lines.end());
-  EXPECT_EQ(Lines(at, at + 3), (Lines{u"Anomaly Alerts", dir.path(), listed + dir.path() + u" path contains 7 Component(s)."}));
+  EXPECT_EQ(Lines(at, at + 3), (Lines{u"Anomaly Alerts", dir.path(), listed + dir.path() + u" path contains 10 Component(s)."}));
   EXPECT_EQ(count(listed + in(u"Empty", u"Outbox") + u" path contains 0 file(s)."), 1);
   EXPECT_EQ(count(listed + in(u"Anomaly Alerts", u"Sent items") + u" path contains 1 file(s)."), 1);
   EXPECT_EQ(count(listed + in(u"Anomaly Alerts", u"Sent items") + u" path contains 0 file(s)."), 1);
