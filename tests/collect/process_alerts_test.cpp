@@ -287,12 +287,12 @@ TEST_F(ProcessAlertFilesTest, ACycleRunsUnderTheLockOverADatabaseUntilAStop) {
   for (const Case& c : cases) {
     SCOPED_TRACE(&c - cases);
     test::TempDir dir;
-    test::CapturedLog log;
     test::WriteText(dir.Join(u"Comp\\info.dat"), "");
     for (const char16_t* name : {u"Sent items\\a.eml", u"Sent items\\b.eml", u"Outbox\\c.eml"}) {
       test::WriteText(dir.Join(u"Comp\\AlertReports\\" + std::u16string(name)), Message());
     }
     EnsureDatabase(dir.path());
+    test::CapturedLog log;
     const std::u16string lock = CollectorLockPathOf(dir.path());
     platform::FileResult failure;
     platform::FileLock held = c.fault == F::kLockHeld ? env_.TryLockFile(lock, &failure) : nullptr;
