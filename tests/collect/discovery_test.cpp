@@ -70,28 +70,25 @@ TEST(RunCollectionCycle, HandsEachReportFolderOnInOrderWithItsStatusAndComponent
   Lines calls, anomaly;
   RunCollectionCycle(dir.path(), [&](StringList& files, const std::u16string& status, const std::u16string& component) {
     for (const auto& f : files) {
-      (component == u"Anomaly Alerts" ? anomaly : calls).push_back(component + u" " + status + u" " + f);
+      (component == u"Anomaly Alerts" ? anomaly : calls).push_back(component + u" " + status + u" " + platform::NameOf(f));
       std::filesystem::rename(test::Narrow(f), test::Narrow(ProcName(f)));  // as the processing does
     }
   });
-  const auto in = [&](const char16_t* folder, const char16_t* name) {
-    return dir.Join(std::u16string(folder) + u"\\AlertReports\\" + name);
-  };
-  EXPECT_EQ(calls, (Lines{u"Comp Delivered " + in(u"Comp", u"Sent items\\s.eml"),
-                          u"Comp Failed " + in(u"Comp", u"Outbox\\o.eml"),
-                          u"All Environment Changes Failed " + in(u"All Environment Changes", u"Outbox\\e.eml"),
-                          u"Predefine Alerts Delivered " + in(u"Predefine Alerts", u"Sent items\\p.eml")}));
-  EXPECT_EQ(anomaly, Lines{u"Anomaly Alerts Delivered " + in(u"Anomaly Alerts", u"Sent items\\n.eml")});
+  EXPECT_EQ(calls, (Lines{u"Comp Delivered s.eml", u"Comp Failed o.eml", u"All Environment Changes Failed e.eml",
+                          u"Predefine Alerts Delivered p.eml"}));
+  EXPECT_EQ(anomaly, Lines{u"Anomaly Alerts Delivered n.eml"});
 
   const Lines lines = log.Messages();
-  const auto count = [&](const std::u16string& line) { return std::count(lines.begin(), lines.end(), line); };
   const std::u16string listed = u"After calling GetDomainFolders Function: ";
+  const auto count = [&](const char16_t* folder, const char16_t* tail) {
+    return std::count(lines.begin(), lines.end(), listed + dir.Join(folder) + u" path contains " + tail);
+  };
   const auto at = std::find(lines.begin(), lines.end(), u"Anomaly Alerts");
   ASSERT_LT(at + 2, lines.end());
   EXPECT_EQ(Lines(at, at + 3), (Lines{u"Anomaly Alerts", dir.path(), listed + dir.path() + u" path contains 10 Component(s)."}));
-  EXPECT_EQ(count(listed + in(u"Empty", u"Outbox") + u" path contains 0 file(s)."), 1);
-  EXPECT_EQ(count(listed + in(u"Anomaly Alerts", u"Sent items") + u" path contains 1 file(s)."), 1);
-  EXPECT_EQ(count(listed + in(u"Anomaly Alerts", u"Sent items") + u" path contains 0 file(s)."), 1);
+  EXPECT_EQ(count(u"Empty\\AlertReports\\Outbox", u"0 file(s)."), 1);
+  EXPECT_EQ(count(u"Anomaly Alerts\\AlertReports\\Sent items", u"1 file(s)."), 1);
+  EXPECT_EQ(count(u"Anomaly Alerts\\AlertReports\\Sent items", u"0 file(s)."), 1);
 }
 
 }  // namespace
