@@ -13,11 +13,6 @@ namespace {
 
 using Lines = std::vector<std::u16string>;
 
-StringList Sorted(StringList list) {
-  std::sort(list.begin(), list.end());
-  return list;
-}
-
 // "*.eml*" in any case, files only, no "PROC_" (with case) anywhere in the
 // path, and nothing when the search pattern would not fit the search's buffer.
 TEST(GetDomainFolders, ListsTheUnprocessedAlertFiles) {
@@ -26,10 +21,7 @@ TEST(GetDomainFolders, ListsTheUnprocessedAlertFiles) {
     const std::u16string start = dir.Join(u"R");
     return start + std::u16string(length - start.size(), u'r');
   };
-  struct Case {
-    std::u16string folder;
-    std::vector<const char16_t*> names, listed;
-  };
+  struct Case { std::u16string folder; std::vector<const char16_t*> names, listed; };
   const Case cases[] = {
       {dir.Join(u"C\\AlertReports\\Sent items"),
        {u"a.eml", u"b.EML", u"c.emlx", u"PROC_d.eml", u"proc_e.eml", u"f.txt", u"xPROC_g.eml", u"h.em"},
@@ -46,7 +38,8 @@ TEST(GetDomainFolders, ListsTheUnprocessedAlertFiles) {
     StringList files, expected;
     GetDomainFolders(c.folder, files);
     for (const char16_t* name : c.listed) expected.push_back(prefix + name);
-    EXPECT_EQ(Sorted(files), expected);
+    std::sort(files.begin(), files.end());
+    EXPECT_EQ(files, expected);
   }
 }
 

@@ -61,7 +61,7 @@ bool Logged(const Lines& log, const Lines& patterns, const std::u16string& path)
 // the log had seen finished by then.
 class TestEnv : public platform::Env {
  public:
-  enum class Fault { kNone, kNoDate, kNoDatabase, kRefuseInsert, kBadVariantTime, kHeld, kOverCap, kAtCap, kRenameRefused,
+  enum class Fault { kNone, kNoDate, kNoDatabase, kRefuseInsert, kBadVariantTime, kOverCap, kAtCap, kRenameRefused,
                      kRenameVanishes, kStopBefore, kStopRename };
   explicit TestEnv(const test::CapturedLog& captured) : log(captured) {}
   platform::SystemTime UtcNow() override { return {2031, 2, 6, 15, 12, 30, 45, 0}; }
@@ -79,7 +79,6 @@ class TestEnv : public platform::Env {
     const auto done = std::count_if(lines.begin(), lines.end(), [](auto& m) { return m.ends_with(u"renamed"); });
     std::lock_guard<std::mutex> lock(mutex);
     reads.push_back({std::this_thread::get_id(), done});
-    if (fault == Fault::kHeld) return {platform::FileStatus::kSharingViolation, 32};
     return Env::ReadFile(path, bytes, max_bytes);
   }
   platform::FileResult RenameNoReplace(const std::u16string& from, const std::u16string& to) override {
@@ -194,8 +193,6 @@ TEST_F(ProcessAlertFilesTest, EachFileIsStoredOnceMarkedOrLeftForTheNextCycle) {
       {no_type, kTable, F::kNone, true, 0, 0, u"PROC_a.eml", u""},
       {kSubject, kTable, F::kNoDatabase, false, 0, 1, u"a.eml", u""},
       {kSubject, kTable, F::kRefuseInsert, false, 0, 1, u"a.eml", u"Data is not inserted in DB"},
-      {kSubject, kTable, F::kHeld, false, 0, 1, u"a.eml",
-       u"% is still being written (in use by another process (32)); it is offered again next cycle"},
       {kSubject, kTable, F::kOverCap, false, 0, 1, u"a.eml",
        u"% holds 134217729 bytes, more than the 134217728 an alert file may hold; it keeps its name"},
       {kSubject, kTable, F::kAtCap, false, 1, 1, u"PROC_a.eml", u"%Successfully renamed"},
@@ -250,14 +247,12 @@ TEST_F(ProcessAlertFilesTest, AStopEndsTheCallAfterTheFileInHand) {
   for (const F fault : {F::kStopBefore, F::kStopRename}) {
     platform::StopSignal stop;
     if (fault == F::kStopBefore) stop.Request();
-    env_.fault = fault;
-    env_.stop = &stop;
+    env_.fault = fault, env_.stop = &stop;
     CycleContext cycle(&stop);
-    const std::u16string component = fault == F::kStopBefore ? u"Before" : u"Rename";
-    const StringList files = Process(component, {Message(), Message()}, u"Delivered", &cycle);
+    const StringList files = Process(fault == F::kStopBefore ? u"Before" : u"Rename", {Message(), Message()}, u"", &cycle);
     const std::u16string first = platform::NameOf(files[0]), second = platform::NameOf(files[1]);
-    const Lines left = fault == F::kStopBefore ? Lines{first, second} : Lines{second, u"PROC_" + first};
-    EXPECT_EQ(test::ListNames(platform::FolderOf(files[0])), left);
+    EXPECT_EQ(test::ListNames(platform::FolderOf(files[0])),
+              (fault == F::kStopBefore ? Lines{first, second} : Lines{second, u"PROC_" + first}));
   }
 }
 

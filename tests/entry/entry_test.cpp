@@ -16,10 +16,7 @@ constexpr uint32_t kDeadlineMs = 60000;  // a safety net only: every wait ends o
 // The first cycle one interval after the start, then one per interval, also
 // after a cycle that threw, until a stop, which cuts a sleep short.
 TEST(ProcessingThread, RunsACycleAfterEachIntervalUntilAStop) {
-  struct Case {
-    uint32_t interval_ms;
-    int least, most;  // cycles before the stop is seen
-  };
+  struct Case { uint32_t interval_ms; int least, most; };  // least and most cycles before the stop is seen
   for (const Case c : {Case{1, 3, 1 << 30}, Case{3600000, 0, 0}}) {
     test::CapturedLog log;
     std::atomic<int> cycles{0};
@@ -33,8 +30,7 @@ TEST(ProcessingThread, RunsACycleAfterEachIntervalUntilAStop) {
     thread->RequestStop();
     ASSERT_TRUE(thread->WaitUntilFinished(kDeadlineMs));
     EXPECT_EQ(thread->CyclesCompleted(), static_cast<uint64_t>(cycles.load()));
-    EXPECT_GE(cycles.load(), c.least);
-    EXPECT_LE(cycles.load(), c.most);
+    EXPECT_TRUE(cycles >= c.least && cycles <= c.most) << cycles;
     EXPECT_EQ(log.Messages(), Lines{u"Inside EnableProcessAlertThread(LPVOID lp)"});
   }
 }
@@ -52,8 +48,6 @@ class GatedThreads : public platform::Env {
   }
   int started = 0;
   platform::StopSignal open;
-
- private:
   void (*fn_)(void*) = nullptr;
   void* arg_ = nullptr;
 };
@@ -79,18 +73,16 @@ TEST(GetSuccAlertsInfo, StartsOneThreadOfTheTenSecondCycleAndLogsInOrder) {
   EXPECT_TRUE(processor.StopProcessing(kDeadlineMs));
 }
 
-TEST(HostText, ReadsWideTextsOfThisPlatform) {
-  EXPECT_EQ(HostText(nullptr), u"");
-  EXPECT_EQ(HostText(L"caf\u00e9 \U0001F600"), u"caf\u00e9 \U0001F600");
-}
-
 struct HostIn : platform::Env {
   std::u16string exe;
   std::u16string ExecutablePath() override { return exe; }
 };
 
-// The count export's body hands the filter and the range on in that order.
-TEST(GetAlertCountForHost, PassesTheFilterThenTheRange) {
+// The count export's body reads the host's wide texts (null as empty) and
+// hands the filter and the range on in that order.
+TEST(GetAlertCountForHost, ReadsTheHostsTextsAndPassesTheFilterThenTheRange) {
+  EXPECT_EQ(HostText(nullptr), u"");
+  EXPECT_EQ(HostText(L"caf\u00e9 \U0001F600"), u"caf\u00e9 \U0001F600");
   test::TempDir dir;
   HostIn host;
   host.exe = dir.Join(u"host.exe");
