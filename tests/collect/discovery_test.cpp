@@ -62,10 +62,12 @@ TEST(RunCollectionCycle, HandsEachReportFolderOnInOrderWithItsStatusAndComponent
   test::MakeFolders(dir.Join(u"F\\info.dat"));
   Lines calls, anomaly;
   RunCollectionCycle(dir.path(), [&](StringList& files, const std::u16string& status, const std::u16string& component) {
+    std::u16string call = component + u" " + status;
     for (const auto& f : files) {
-      (component == u"Anomaly Alerts" ? anomaly : calls).push_back(component + u" " + status + u" " + platform::NameOf(f));
+      call += u" " + platform::NameOf(f);
       std::filesystem::rename(test::Narrow(f), test::Narrow(ProcName(f)));  // as the processing does
     }
+    (component == u"Anomaly Alerts" ? anomaly : calls).push_back(call);
   });
   EXPECT_EQ(calls, (Lines{u"Comp Delivered s.eml", u"Comp Failed o.eml", u"All Environment Changes Failed e.eml",
                           u"Predefine Alerts Delivered p.eml"}));
