@@ -72,7 +72,6 @@ TEST(RunCollectionCycle, HandsEachReportFolderOnInOrderWithItsStatusAndComponent
   EXPECT_EQ(calls, (Lines{u"Comp Delivered s.eml", u"Comp Failed o.eml", u"All Environment Changes Failed e.eml",
                           u"Predefine Alerts Delivered p.eml"}));
   EXPECT_EQ(anomaly, Lines{u"Anomaly Alerts Delivered n.eml"});
-
   const Lines lines = log.Messages();
   const std::u16string listed = u"After calling GetDomainFolders Function: ";
   const auto count = [&](const char16_t* folder, const char16_t* tail) {
@@ -80,7 +79,8 @@ TEST(RunCollectionCycle, HandsEachReportFolderOnInOrderWithItsStatusAndComponent
   };
   const auto at = std::find(lines.begin(), lines.end(), u"Anomaly Alerts");
   ASSERT_LT(at + 2, lines.end());
-  EXPECT_EQ(Lines(at, at + 3), (Lines{u"Anomaly Alerts", dir.path(), listed + dir.path() + u" path contains 10 Component(s)."}));
+  EXPECT_EQ(Lines(at, at + 3), (Lines{u"Anomaly Alerts", dir.path(), listed + dir.path() + u" path contains 10 "
+                                                                                          u"Component(s)."}));
   EXPECT_EQ(count(u"Empty\\AlertReports\\Outbox", u"0 file(s)."), 1);
   EXPECT_EQ(count(u"Anomaly Alerts\\AlertReports\\Sent items", u"1 file(s)."), 1);
   EXPECT_EQ(count(u"Anomaly Alerts\\AlertReports\\Sent items", u"0 file(s)."), 1);

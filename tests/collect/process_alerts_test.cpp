@@ -164,8 +164,8 @@ TEST_F(ProcessAlertFilesTest, EachAlertGivesItsRowInColumnOrder) {
     const auto rows = Sql(dir_.path());
     ASSERT_EQ(rows.size(), static_cast<size_t>(&c - cases + 1));
     EXPECT_EQ(rows.back(), expected);
-    const std::u16string fields = u"After calling \"ParseHtmlBodyAndGetFieldData\" function Who & Operation Fields are ";
-    EXPECT_TRUE(Logged(log.Messages(), {fields + c.who, u"Before calling \"FillDataDB\" function ",
+    const std::u16string fields = u"After calling \"ParseHtmlBodyAndGetFieldData\" function Who & Operation Fields are";
+    EXPECT_TRUE(Logged(log.Messages(), {fields + u" " + c.who, u"Before calling \"FillDataDB\" function ",
                                         u"After calling \"FillDataDB\" function ", u"%Successfully renamed"}, files[0]));
   }
 }
@@ -176,7 +176,6 @@ TEST_F(ProcessAlertFilesTest, EachAlertGivesItsRowInColumnOrder) {
 // well. A file gone after it was read keeps its row.
 TEST_F(ProcessAlertFilesTest, EachFileIsStoredOnceMarkedOrLeftForTheNextCycle) {
   const std::string no_type = "no colon and no quotes";
-  const char16_t* kEmpty = u"Alert subject and body are empty.";
   struct Case {
     std::string subject, html;
     F fault;
@@ -186,8 +185,8 @@ TEST_F(ProcessAlertFilesTest, EachFileIsStoredOnceMarkedOrLeftForTheNextCycle) {
     const char16_t* line;    // a line of this call ('%' stands for the path)
   };
   const Case cases[] = {
-      {kSubject, "", F::kNone, false, 0, 0, u"PROC_a.eml", kEmpty},
-      {"", kTable, F::kNone, false, 0, 0, u"PROC_a.eml", kEmpty},
+      {kSubject, "", F::kNone, false, 0, 0, u"PROC_a.eml", u"Alert subject and body are empty."},
+      {"", kTable, F::kNone, false, 0, 0, u"PROC_a.eml", u"Alert subject and body are empty."},
       {no_type, kTable, F::kNone, false, 0, 0, u"PROC_a.eml", u""},
       {kSubject, kTable, F::kNone, true, 1, 1, u"PROC_a.eml", u"%Successfully renamed"},
       {no_type, kTable, F::kNone, true, 0, 0, u"PROC_a.eml", u""},
@@ -210,7 +209,9 @@ TEST_F(ProcessAlertFilesTest, EachFileIsStoredOnceMarkedOrLeftForTheNextCycle) {
     test::WriteText(files[0], Message(c.subject, c.html));
     if (c.taken) test::WriteText(ProcName(files[0]), "earlier");
     if (c.fault != F::kNoDatabase) EnsureDatabase(dir.path());
-    if (c.fault == F::kRefuseInsert) Sql(dir.path(), "CREATE TRIGGER no BEFORE INSERT ON AlertDB BEGIN SELECT RAISE(ABORT, '');END");
+    if (c.fault == F::kRefuseInsert) {
+      Sql(dir.path(), "CREATE TRIGGER no BEFORE INSERT ON AlertDB BEGIN SELECT RAISE(ABORT, 'no'); END");
+    }
     env_.fault = c.fault;
     ProcessAlertFiles(dir.path(), files, u"Delivered", u"Comp");
     EXPECT_EQ(Sql(dir.path()).size(), c.rows);
@@ -219,7 +220,6 @@ TEST_F(ProcessAlertFilesTest, EachFileIsStoredOnceMarkedOrLeftForTheNextCycle) {
     const Lines lines = log.Messages();
     EXPECT_TRUE(Logged(lines, {c.line}, files[0]));
     EXPECT_EQ(std::count(lines.begin(), lines.end(), files[0] + u"Successfully renamed"), c.rows && c.name ? 1 : 0);
-
     env_.fault = F::kNone;
     if (c.fault == F::kRefuseInsert) Sql(dir.path(), "DROP TRIGGER no");
     ProcessAlertFiles(dir.path(), files, u"Delivered", u"Comp");
@@ -249,7 +249,7 @@ TEST_F(ProcessAlertFilesTest, AStopEndsTheCallAfterTheFileInHand) {
     if (fault == F::kStopBefore) stop.Request();
     env_.fault = fault, env_.stop = &stop;
     CycleContext cycle(&stop);
-    const StringList files = Process(fault == F::kStopBefore ? u"Before" : u"Rename", {Message(), Message()}, u"", &cycle);
+    const StringList files = Process(fault == F::kStopBefore ? u"B" : u"R", {Message(), Message()}, u"", &cycle);
     const std::u16string first = platform::NameOf(files[0]), second = platform::NameOf(files[1]);
     EXPECT_EQ(test::ListNames(platform::FolderOf(files[0])),
               (fault == F::kStopBefore ? Lines{first, second} : Lines{second, u"PROC_" + first}));

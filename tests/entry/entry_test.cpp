@@ -89,7 +89,7 @@ TEST(GetAlertCountForHost, ReadsTheHostsTextsAndPassesTheFilterThenTheRange) {
   platform::ScopedEnv scope(&host);
   CSettingDBManagement store;
   ASSERT_TRUE(store.OpenDB(DatabasePathOf(dir.path())));
-  ASSERT_TRUE(store.FillDatainDB({u"Email Alert", u"", u"", u"2024/03/05 10:00:00", u"", u"", u"", u"", u"", u"", u""}));
+  ASSERT_TRUE(store.FillDatainDB({u"Email Alert", u"", u"", u"2024/03/05 10:00:00", u"", u"", u"", u"", u"", u"", {}}));
   store.CloseDB();
   const wchar_t* range = L"<FROM>2024/03/01 00:00:00</FROM><TO>2024/03/31 23:59:59</TO>";
   EXPECT_EQ(GetAlertCountForHost(L"Email Alert", range), 1);
