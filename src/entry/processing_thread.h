@@ -31,6 +31,7 @@ class ProcessingThread {
   // from one thread at a time.
   bool WaitUntilFinished(uint32_t ms);
   uint64_t CyclesCompleted() const { return cycles_.load(); }
+  uint32_t IntervalMs() const { return interval_ms_; }
 
  private:
   ProcessingThread(uint32_t interval_ms, Cycle cycle);
