@@ -62,7 +62,7 @@ bool Logged(const Lines& log, const Lines& patterns, const std::u16string& path)
 class TestEnv : public platform::Env {
  public:
   enum class Fault { kNone, kNoDate, kNoDatabase, kRefuseInsert, kBadVariantTime, kOverCap, kAtCap, kRenameRefused,
-                     kRenameVanishes, kStopBefore, kStopRename };
+                     kRenameVanishes, kStopBefore, kStopRename, kBeingWritten };
   explicit TestEnv(const test::CapturedLog& captured) : log(captured) {}
   platform::SystemTime UtcNow() override { return {2031, 2, 6, 15, 12, 30, 45, 0}; }
   platform::SystemTime LocalNow() override { return UtcNow(); }
@@ -79,6 +79,7 @@ class TestEnv : public platform::Env {
     const auto done = std::count_if(lines.begin(), lines.end(), [](auto& m) { return m.ends_with(u"renamed"); });
     std::lock_guard<std::mutex> lock(mutex);
     reads.push_back({std::this_thread::get_id(), done});
+    if (fault == Fault::kBeingWritten) return {platform::FileStatus::kSharingViolation, 32};
     return Env::ReadFile(path, bytes, max_bytes);
   }
   platform::FileResult RenameNoReplace(const std::u16string& from, const std::u16string& to) override {
@@ -166,7 +167,8 @@ TEST_F(ProcessAlertFilesTest, EachAlertGivesItsRowInColumnOrder) {
     EXPECT_EQ(rows.back(), expected);
     const std::u16string fields = u"After calling \"ParseHtmlBodyAndGetFieldData\" function Who & Operation Fields are";
     EXPECT_TRUE(Logged(log.Messages(), {fields + u" " + c.who, u"Before calling \"FillDataDB\" function ",
-                                        u"After calling \"FillDataDB\" function ", u"%Successfully renamed"}, files[0]));
+                                        u"After calling \"FillDataDB\" function ", u"%Successfully renamed"},
+                       files[0]));
   }
 }
 
@@ -195,6 +197,8 @@ TEST_F(ProcessAlertFilesTest, EachFileIsStoredOnceMarkedOrLeftForTheNextCycle) {
       {kSubject, kTable, F::kOverCap, false, 0, 1, u"a.eml",
        u"% holds 134217729 bytes, more than the 134217728 an alert file may hold; it keeps its name"},
       {kSubject, kTable, F::kAtCap, false, 1, 1, u"PROC_a.eml", u"%Successfully renamed"},
+      {kSubject, kTable, F::kBeingWritten, false, 0, 1, u"a.eml",
+       u"% is still being written (in use by another process (32)); it is offered again next cycle"},
       {kSubject, kTable, F::kRenameRefused, false, 0, 1, u"a.eml", u"% could not be renamed to its PROC_ name: access "
                                                                     u"denied (5)"},
       {kSubject, kTable, F::kRenameVanishes, false, 1, 1, nullptr, u"% could not be renamed to its PROC_ name: not "
