@@ -46,6 +46,8 @@ class GatedThreads : public platform::Env {
       env->fn_(env->arg_);
     }, this);
   }
+  std::u16string ExecutablePath() override { return install.Join(u"host.exe"); }  // its cycles stay in here
+  test::TempDir install;
   int started = 0;
   platform::StopSignal open;
   void (*fn_)(void*) = nullptr;
