@@ -16,15 +16,12 @@ TEST(MimeParameter, ReadsPlainAndRfc2231Forms) {
   const struct {
     const char *value, *name, *expected;  // null: absent
   } cases[] = {
-      {"text/plain; Name=\"a;b\\\"c\"; name=second", "name", "a;b\"c"},
+      {"text/plain; Name=\"a;b\\\"c\"; name=second", "name", "a;b\"c"}, {"text/plain; name", "name", nullptr},
       {"text/plain; name=plain.txt; name*=iso-8859-1'fr'caf%E9.txt", "name", "caf\xC3\xA9.txt"},
       {"text/plain; charset*=us-ascii'en'koi8-r", "charset", "koi8-r"},
       {"text/plain; name*1=\"b c\"; name*0*=utf-8''%E2%82%AC%20; name*2*=%2Epem", "name", "\xE2\x82\xAC b c.pem"},
-      {"text/plain; name*0=a; name*2=c", "name", "a"},
-      {"text/plain; name*1=b; name=fallback", "name", "fallback"},
-      {"text/plain; name*=100%25%zz%4", "name", "100%%zz%4"},
-      {"text/plain; filename*=utf-8''x", "name", nullptr},
-      {"text/plain; name", "name", nullptr},
+      {"text/plain; name*0=a; name*2=c", "name", "a"}, {"text/plain; name*1=b; name=fallback", "name", "fallback"},
+      {"text/plain; name*=100%25%zz%4", "name", "100%%zz%4"}, {"text/plain; filename*=utf-8''x", "name", nullptr},
   };
   for (const auto& c : cases) {
     EXPECT_EQ(Parameter(c.value, c.name).value_or("(absent)"), c.expected ? c.expected : "(absent)") << c.value;
@@ -75,29 +72,27 @@ std::string Part(const std::string& headers, const std::string& content, const s
 
 TEST(GetBody, FollowsTheRulesInOrder) {
   const std::string alt = "multipart/alternative", mixed = "multipart/mixed", plain = "Content-Type: text/plain\r\n",
-                    html = "Content-Type: text/html\r\n", attached = "Content-Disposition: attachment\r\n";
+                    html = "Content-Type: text/html\r\n", attached = "Content-Disposition: attachment\r\n",
+                    pdf = "Content-Type: application/pdf\r\n";
   const struct {
     const char* name;
     std::string text;
     const char* body;
   } cases[] = {
-      {"plain only", "Subject: s\r\n\r\nplain", "plain"},
-      {"html only", html + "\r\n<b>x</b>", "<b>x</b>"},
+      {"plain only", "Subject: s\r\n\r\nplain", "plain"}, {"html only", html + "\r\n<b>x</b>", "<b>x</b>"},
       {"alternative prefers html", Multipart(alt, Part(plain, "p") + Part(html, "<h>")), "<h>"},
       {"alternative without html: the first", Multipart(alt, Part(plain, "p1") + Part(plain, "p2")), "p1"},
       {"html attachment is no alternative", Multipart(alt, Part(plain, "p") + Part(html + attached, "<h>")), "p"},
-      {"alternative inside mixed",
-       Multipart(mixed, "--XX\r\n" + Multipart(alt, Part(plain, "p", "YY") + Part(html, "<h>", "YY"), "YY") +
-                            Part("Content-Type: application/pdf\r\n", "%PDF")),
-       "<h>"},
-      {"only part application/pdf", Multipart(mixed, Part("Content-Type: application/pdf\r\n", "%PDF")), ""},
+      {"alternative inside mixed", Multipart(mixed, "--XX\r\n" + Multipart(alt, Part(plain, "p", "YY") +
+                                                   Part(html, "<h>", "YY"), "YY") + Part(pdf, "%PDF")), "<h>"},
+      {"only part application/pdf", Multipart(mixed, Part(pdf, "%PDF")), ""},
       {"top-level image", "Content-Type: image/png\r\n\r\n\x89PNG", ""},
       {"top-level video", "Content-Type: video/mp4\r\n\r\nx", ""},
       {"attachment first, text second", Multipart(mixed, Part(plain + attached, "att") + Part(plain, "main")), "main"},
       {"two attachments: the first", Multipart(mixed, Part(attached, "a1") + Part(attached, "a2")), "a1"},
-      {"file name in RFC 2231 continuations",
-       Multipart(mixed, Part("Content-Type: text/plain; name*0*=utf-8''key%2E; name*1=pem\r\n", "a") + Part("", "m")),
-       "m"},
+      {"file name in RFC 2231 continuations", Multipart(mixed, Part("Content-Type: text/plain; "
+                                                                    "name*0*=utf-8''key%2E; name*1=pem\r\n", "a") +
+                                                               Part("", "m")), "m"},
       {"missing boundary: opaque text", "Content-Type: multipart/mixed\r\n\r\nraw", "raw"},
       {"base64 text in a declared charset",
        "Content-Type: text/plain; charset=windows-1252\r\nContent-Transfer-Encoding: BASE64\r\n\r\ngIA=",
@@ -112,10 +107,8 @@ TEST(GetBody, FollowsTheRulesInOrder) {
        "<in2>"},
       {"never-closing boundary",
        "Content-Type: " + alt + "; boundary=XX\r\n\r\n" + Part("", "first") + "--XX\r\n" + html + "\r\n<last", "<last"},
-      {"boundary in RFC 2231 form",
-       "Content-Type: multipart/alternative; boundary*=\"us-ascii''abc\"\r\n\r\n" + Part("", "p", "abc") +
-           Part(html, "<h>", "abc") + "--abc--\r\n",
-       "<h>"},
+      {"boundary in RFC 2231 form", "Content-Type: multipart/alternative; boundary*=\"us-ascii''abc\"\r\n\r\n" +
+                                        Part("", "p", "abc") + Part(html, "<h>", "abc") + "--abc--\r\n", "<h>"},
       {"part without an empty line is all content", Multipart(mixed, "--XX\r\nhello\r\n"), "hello"},
   };
   for (const auto& c : cases) {
@@ -129,6 +122,12 @@ std::string Repeat(const std::string& piece, size_t times) {
   std::string out;
   for (size_t i = 0; i < times; ++i) out += piece;
   return out;
+}
+
+void Measure(const MimePart& part, int level, size_t* parts, int* depth) {
+  ++*parts;
+  *depth = std::max(*depth, level);
+  for (const MimePart& sub : part.parts) Measure(sub, level + 1, parts, depth);
 }
 
 // Hostile nesting, part counts and junk load within the caps, without
@@ -150,18 +149,13 @@ TEST(LoadEml, HostileInputLoadsWithinTheCaps) {
       {"Content-Type: multipart/mixed; boundary=\"\"\r\n\r\n--\r\n\r\na\r\n", 1, 0},
       {Multipart("multipart/mixed", Part("", "a", q), q), 1, 0},
       {Multipart("multipart/mixed", Part("Content-Transfer-Encoding: base64\r\n", "QUJD\r\n--XX\r\nREVG")), 3, 1},
-      {junk},
-      {std::string("Subject: a\0b\r\nFrom: x\0@y\r\n\r\nbo\0dy", 34)},
-      {"Subject: truncated =?utf-8?B?QUJ"},
+      {junk}, {std::string("Subject: a\0b\r\nFrom: x\0@y\r\n\r\nbo\0dy", 34)}, {"Subject: truncated =?utf-8?B?QUJ"},
       {Multipart("multipart/mixed", "--XX\r\nContent-Type: text/plain; charset=iso-2022-jp\r\n")},
       {"Subject: x\r\nContent-Type: text/plain;" + Repeat(";", 1000000) + "charset=utf-8\r\n\r\nbody"},
       {"Subject: x" + Repeat("\r\n y", 1000000) + "\r\n\r\nbody"},
-      {"Subject: " + Repeat("=?", 500000) + "\r\n\r\n"},
-      {"From: " + Repeat("(", 500000) + "\r\n\r\n"},
-      {"From: " + Repeat("\"", 500001) + "\r\n\r\n"},
-      {Repeat("\r", 100000) + "Subject: only CRs"},
-      {Repeat("\n", 100000)},
-      {"Date: " + Repeat("9", 100000) + "\r\n\r\n"},
+      {"Subject: " + Repeat("=?", 500000) + "\r\n\r\n"}, {"From: " + Repeat("(", 500000) + "\r\n\r\n"},
+      {"From: " + Repeat("\"", 500001) + "\r\n\r\n"}, {Repeat("\r", 100000) + "Subject: only CRs"},
+      {Repeat("\n", 100000)}, {"Date: " + Repeat("9", 100000) + "\r\n\r\n"},
   };
   for (const auto& c : cases) {
     ClsEmail email;
@@ -169,13 +163,7 @@ TEST(LoadEml, HostileInputLoadsWithinTheCaps) {
     (void)email.FromAddress(), (void)email.Subject(), (void)email.Body(), (void)email.LocalDate();
     size_t parts = 0;
     int depth = 0;
-    std::vector<std::pair<const MimePart*, int>> stack = {{&email.message().root, 0}};
-    while (!stack.empty()) {
-      auto [part, level] = stack.back();
-      stack.pop_back();
-      ++parts, depth = std::max(depth, level);
-      for (const MimePart& sub : part->parts) stack.push_back({&sub, level + 1});
-    }
+    Measure(email.message().root, 0, &parts, &depth);
     EXPECT_LE(parts, c.max_parts) << c.text.substr(0, 60);
     EXPECT_LE(depth, c.max_depth) << c.text.substr(0, 60);
   }
