@@ -11,27 +11,22 @@ namespace {
 using Texts = std::vector<std::u16string>;
 
 TEST(TextOps, CutsClampAndReplaceScansOnce) {
-  const struct {
-    std::u16string got, want;
-  } cases[] = {
+  const std::pair<std::u16string, std::u16string> cases[] = {
       {Left(u"abc", -1), u""},    {Left(u"abc", 2), u"ab"},   {Left(u"abc", 99), u"abc"}, {Right(u"abc", -5), u""},
       {Right(u"abc", 1), u"c"},   {Right(u"abc", 4), u"abc"}, {Mid(u"abc", -1), u"abc"},  {Mid(u"abc", 1), u"bc"},
       {Mid(u"abc", 7), u""},      {Replace(u"aaa", u"aa", u"b"), u"ba"}, {Replace(u"&&##7", u"&#", u""), u"&#7"},
       {Replace(u"abc", u"", u"z"), u"abc"}, {Replace(u"a", u"a", u"aa"), u"aa"},
       {TrimLeft(u" \u3000x \u00A0"), u"x \u00A0"}, {TrimRight(u" \u3000x \u00A0"), u" \u3000x"},
   };
-  for (const auto& c : cases) EXPECT_EQ(c.got, c.want) << test::Narrow(c.want);
-  EXPECT_EQ(Find(u"a::b", u"::"), 1);
-  EXPECT_EQ(Find(u"ab", u"B"), -1);
-  EXPECT_EQ(ReverseFind(u"a:b:c", u':'), 3);
-  EXPECT_EQ(ReverseFind(u"abc", u':'), -1);
+  for (const auto& [got, want] : cases) EXPECT_EQ(got, want) << test::Narrow(want);
+  const std::pair<std::ptrdiff_t, std::ptrdiff_t> found[] = {
+      {Find(u"a::b", u"::"), 1}, {Find(u"ab", u"B"), -1}, {ReverseFind(u"a:b:c", u':'), 3},
+      {ReverseFind(u"abc", u':'), -1}};
+  for (const auto& [got, want] : found) EXPECT_EQ(got, want);
 }
 
 TEST(DecodeHtmlNumericEntities, ReadsRunsOfReferences) {
-  const struct {
-    std::u16string_view text;
-    std::u16string want;
-  } cases[] = {
+  const std::pair<std::u16string_view, std::u16string> cases[] = {
       // Text after the last ';' is dropped; no ';' leaves the text as it is;
       // named references are not known; the low 16 bits of the number count.
       {u"&#72;&#105;", u"Hi"}, {u"&#72;&#105;!", u"Hi"}, {u"FileServer", u"FileServer"}, {u"", u""},
@@ -39,9 +34,7 @@ TEST(DecodeHtmlNumericEntities, ReadsRunsOfReferences) {
       {u"&#70;&nbsp;&#49;", std::u16string(u"F\0" u"1", 3)}, {u"&# 65;&#&#66;;", std::u16string(u"AB\0", 3)},
       {u"&#-1;&#65601;", u"\uFFFF" u"A"}, {u"&#99999999999;", u"\uFFFF"}, {u"&#55357;", u"\xD83D"},
   };
-  for (const auto& c : cases) {
-    EXPECT_EQ(DecodeHtmlNumericEntities(c.text), c.want) << test::Narrow(c.text);
-  }
+  for (const auto& [text, want] : cases) EXPECT_EQ(DecodeHtmlNumericEntities(text), want) << test::Narrow(text);
 }
 
 TEST(GetTableIndex, IndexOfLastTable) {
@@ -73,19 +66,14 @@ TEST(HtmlTableReaders, HeadersAndRowsOfSelectedTable) {
     Texts headers;
     std::vector<Texts> rows;
   } cases[] = {
-      // Rows start at "<tbody>", but every th up to the end is a header;
-      // <strong>, th-only and empty rows are passed over; an empty paragraph
-      // is one blank; an inner closing tag leaves nothing.
+      // Rows start at "<tbody>", every th up to the end is a header; <strong>, th-only and empty rows are
+      // passed over; an empty paragraph is one blank; an inner closing tag leaves nothing.
       {kOneTable, 0, {u"Who", u" Name", u"A"}, {{u"Alice", u"S1"}, {u" ", u""}, {u"FS1", u"", u"extra"}}},
       // Index 1 starts at the first "</table>" and reads to the end.
-      {second, 1, {u"Op", u"Late"}, {{u"Read"}, {u"Third"}}},
-      {second, 2, {}, {}},
-      {second, -1, {}, {}},
-      {u"", 0, {}, {}},
-      // Missing start markers: from the beginning of the text.
-      {u"<th>H</th><tr><td>C</td></tr>", 0, {u"H"}, {{u"C"}}},
-      {u"<th>H</th><tr><td>C</td></tr>", 1, {u"H"}, {{u"C"}}},
-      {u"<tr><td>a</td>", 0, {}, {}},  // row never closed
+      {second, 1, {u"Op", u"Late"}, {{u"Read"}, {u"Third"}}}, {second, 2, {}, {}}, {second, -1, {}, {}},
+      // Missing start markers: from the beginning of the text. A row never closed is none.
+      {u"<th>H</th><tr><td>C</td></tr>", 0, {u"H"}, {{u"C"}}}, {u"<th>H</th><tr><td>C</td></tr>", 1, {u"H"}, {{u"C"}}},
+      {u"<tr><td>a</td>", 0, {}, {}}, {u"", 0, {}, {}},
   };
   for (const auto& c : cases) {
     Texts headers{u"kept"};
