@@ -1,244 +1,84 @@
-# Shared steps of the end-to-end scripts.
-#
-# e2e_prepare_install(<dir>)  a fresh install folder holding the host and the library
-# e2e_log_begin()             switches the library's debug log on, empty
-# e2e_log_lines(<var>)        the log's messages, timestamps cut off
-# e2e_log_end()               switches the log off again when we switched it on
-# e2e_host(<out> <rc> args…)  runs the host with the steps given
-# tool(<out> <rc> args…)      runs the support tool; its stderr lands in tool_stderr
-# expect_tool(<rc> <regex> args…)  fails unless the tool exits so and its output matches
-# expect_usage(args…)         fails unless the tool refuses with exit 2, one stderr line, no output
-# tool_lock_held(<out> <rc> <lock file> args…)  runs the tool while another process holds the collector lock
-# expect_json(<json> <expected> <key>… [LENGTH])  fails unless the value (or length) at the keys is as expected
-#                             (booleans read ON/OFF, null reads "")
-# set_retention(<enabled> <days text>)   the retention settings the tool reads (--settings-root on Linux)
-# clear_retention()           removes them again
-# e2e_need(<var> <program> <why>)  skips the test, with one line, when the program is missing
-# sqlite(<out> <db> <sql>)    runs statements with the sqlite3 program (found by e2e_need(SQLITE3 sqlite3 …))
-
+# Shared steps of the end-to-end scripts. Each script works in its own folder, made afresh: ${root}, with the
+# install folder ${install} and the settings tree ${E2E_SETTINGS} (the tool's --settings-root on Linux).
+# Run by itself with -DCONDITIONS, this file is the waiter that feeds the host's "wait" steps (e2e_host).
+set(E2E_COMMON "${CMAKE_CURRENT_LIST_FILE}")
 if(WINDOWS)
+  set(wine_prefix "$ENV{HOME}/.wine-alertsummary")
   if(DEFINED ENV{WINEPREFIX})
-    set(E2E_LOG_DIR "$ENV{WINEPREFIX}/drive_c/AlertSummaryDbg")
-  else()
-    set(E2E_LOG_DIR "$ENV{HOME}/.wine-alertsummary/drive_c/AlertSummaryDbg")
+    set(wine_prefix "$ENV{WINEPREFIX}")
   endif()
+  set(E2E_LOG_DIR "${wine_prefix}/drive_c/AlertSummaryDbg")
   set(E2E_HOST_NAME testhost.exe)
 else()
   set(E2E_LOG_DIR "/var/log/AlertSummaryDbg")
   set(E2E_HOST_NAME testhost)
 endif()
 
-function(e2e_prepare_install dir)
-  file(REMOVE_RECURSE "${dir}")
-  file(MAKE_DIRECTORY "${dir}")
-  file(COPY "${HOST}" "${LIBRARY}" DESTINATION "${dir}")
-endfunction()
-
-function(e2e_log_begin)
-  if(NOT EXISTS "${E2E_LOG_DIR}")
-    file(MAKE_DIRECTORY "${E2E_LOG_DIR}")
-    if(NOT EXISTS "${E2E_LOG_DIR}")
-      message(STATUS "SKIPPED: cannot create the debug log folder ${E2E_LOG_DIR} (run as root)")
+if(DEFINED CONDITIONS)
+  # One line to the host's input as each condition holds, in turn: "log:TEXT" (the log holds TEXT) or
+  # "marked:N" (N alert files below the install folder have their PROC_ name). The deadline is a safety net
+  # against a hang only: the host then reads the end of its input and goes on, and the test fails on what it sees.
+  string(TIMESTAMP deadline "%s")
+  math(EXPR deadline "${deadline} + 100")
+  string(REPLACE "|" ";" CONDITIONS "${CONDITIONS}")
+  foreach(condition IN LISTS CONDITIONS)
+    set(found -1)
+    while(found LESS 0)
+      string(TIMESTAMP now "%s")
+      if(now GREATER deadline)
+        return()
+      elseif(condition MATCHES "^log:(.*)" AND EXISTS "${E2E_LOG_DIR}/ErrorLog.txt")
+        file(READ "${E2E_LOG_DIR}/ErrorLog.txt" log)
+        string(FIND "${log}" "${CMAKE_MATCH_1}" found)
+      elseif(condition MATCHES "^marked:(.*)")
+        file(GLOB_RECURSE marked "${INSTALL}/PROC_*.eml")
+        list(LENGTH marked count)
+        math(EXPR found "${count} - ${CMAKE_MATCH_1}")
+      endif()
+      if(found LESS 0)
+        execute_process(COMMAND ${CMAKE_COMMAND} -E sleep 0.1)
+      endif()
+    endwhile()
+    execute_process(COMMAND ${CMAKE_COMMAND} -E echo held RESULT_VARIABLE r)
+    if(NOT r EQUAL 0)
       return()
     endif()
-    file(WRITE "${WORK}/${CASE}.created-log-dir" "")
-  endif()
-  file(REMOVE "${E2E_LOG_DIR}/ErrorLog.txt")
-endfunction()
+  endforeach()
+  return()
+endif()
 
-function(e2e_log_end)
-  if(EXISTS "${WORK}/${CASE}.created-log-dir")
-    file(REMOVE_RECURSE "${E2E_LOG_DIR}")
-    file(REMOVE "${WORK}/${CASE}.created-log-dir")
-  endif()
-endfunction()
-
-function(e2e_log_lines var)
-  set(lines "")
-  if(EXISTS "${E2E_LOG_DIR}/ErrorLog.txt")
-    file(STRINGS "${E2E_LOG_DIR}/ErrorLog.txt" raw)
-    foreach(line IN LISTS raw)
-      string(REGEX REPLACE "^[^\t]*\t" "" line "${line}")
-      string(REPLACE "\r" "" line "${line}")
-      list(APPEND lines "${line}")
-    endforeach()
-  endif()
-  set(${var} "${lines}" PARENT_SCOPE)
-endfunction()
-
-function(e2e_host out rc dir)
-  execute_process(COMMAND ${EMULATOR} "${dir}/${E2E_HOST_NAME}" ${ARGN}
-    WORKING_DIRECTORY "${dir}" OUTPUT_VARIABLE output ERROR_VARIABLE errors RESULT_VARIABLE result
-    TIMEOUT 100)
-  set(${out} "${output}${errors}" PARENT_SCOPE)
-  set(${rc} "${result}" PARENT_SCOPE)
-endfunction()
+set(root "${WORK}/${CASE}")
+set(install "${root}/install")
+set(E2E_SETTINGS "${root}/settings")
+file(REMOVE_RECURSE "${root}")
+file(MAKE_DIRECTORY "${install}" "${E2E_SETTINGS}")
 
 function(e2e_fail text)
   e2e_log_end()
   message(FATAL_ERROR "${text}")
 endfunction()
 
-# Fails unless `needles` (a list) occur in `lines` in this order.
-function(e2e_expect_in_order lines)
-  set(position 0)
-  list(LENGTH lines count)
-  foreach(needle IN LISTS ARGN)
-    set(found -1)
-    set(i ${position})
-    while(i LESS count)
-      list(GET lines ${i} line)
-      string(FIND "${line}" "${needle}" at)
-      if(at GREATER_EQUAL 0)
-        set(found ${i})
-        break()
-      endif()
-      math(EXPR i "${i} + 1")
-    endwhile()
-    if(found LESS 0)
-      string(REPLACE ";" "\n  " shown "${lines}")
-      e2e_fail("log line '${needle}' missing or out of order; the log:\n  ${shown}")
+# At the top level of a script: switches the library's debug log on, empty (or skips the test where the folder
+# cannot be made); e2e_log_end (and e2e_fail) switch it off again when this script switched it on.
+macro(e2e_log_begin)
+  if(NOT EXISTS "${E2E_LOG_DIR}")
+    file(MAKE_DIRECTORY "${E2E_LOG_DIR}")
+    if(NOT EXISTS "${E2E_LOG_DIR}")
+      message(STATUS "SKIPPED: cannot create the debug log folder ${E2E_LOG_DIR} (run as root)")
+      return()
     endif()
-    math(EXPR position "${found} + 1")
-  endforeach()
-endfunction()
+    file(WRITE "${root}/created-log-dir" "")
+  endif()
+  file(REMOVE "${E2E_LOG_DIR}/ErrorLog.txt")
+endmacro()
 
-# An install folder holding the example alerts `copies` times over.
-function(e2e_many_alerts dir copies)
-  file(COPY "${SOURCE_DIR}/examples/install/" DESTINATION "${dir}")
-  file(GLOB_RECURSE originals "${dir}/*.eml")
-  foreach(k RANGE 2 ${copies})
-    foreach(original IN LISTS originals)
-      get_filename_component(folder "${original}" DIRECTORY)
-      get_filename_component(name "${original}" NAME)
-      file(COPY_FILE "${original}" "${folder}/copy${k}_${name}")
-    endforeach()
-  endforeach()
-endfunction()
-
-# Fails unless every alert file is either marked with its row or untouched:
-# rows stored = files marked (Windows may end the thread between an insert and
-# its rename, which leaves one row more), and none vanished.
-function(e2e_expect_nothing_lost dir total_files)
-  if(WINDOWS)
-    set(allowed_extra_rows 1)
-  else()
-    set(allowed_extra_rows 0)
-  endif()
-  file(GLOB_RECURSE all "${dir}/*.eml")
-  file(GLOB_RECURSE marked "${dir}/PROC_*.eml")
-  list(LENGTH all n_all)
-  list(LENGTH marked n_marked)
-  if(NOT n_all EQUAL total_files)
-    e2e_fail("${total_files} alert files expected, ${n_all} found")
-  endif()
-  find_program(SQLITE3 sqlite3)
-  if(NOT SQLITE3)
-    return()
-  endif()
-  execute_process(COMMAND ${SQLITE3} "${dir}/Alert_Summary/AlertSummaryDB.db" "SELECT count(*) FROM AlertDB"
-    OUTPUT_VARIABLE rows OUTPUT_STRIP_TRAILING_WHITESPACE)
-  # The malformed and the empty example are marked without a row.
-  file(GLOB_RECURSE rowless "${dir}/PROC_*Alert_malformed.eml" "${dir}/PROC_*Alert_empty.eml")
-  list(LENGTH rowless n_rowless)
-  math(EXPR expected "${n_marked} - ${n_rowless}")
-  math(EXPR extra "${rows} - ${expected}")
-  if(extra LESS 0 OR extra GREATER allowed_extra_rows)
-    e2e_fail("${rows} rows for ${expected} alerts marked with a row")
-  endif()
-  message(STATUS "${n_marked} of ${n_all} files marked, ${rows} rows")
-endfunction()
-
-# Fails unless every alert file below `dir` has its PROC_ name.
-function(e2e_expect_all_marked dir)
-  file(GLOB_RECURSE left "${dir}/*.eml*")
-  list(FILTER left EXCLUDE REGEX "/PROC_[^/]*$")
-  if(left)
-    e2e_fail("files left unprocessed: ${left}")
+function(e2e_log_end)
+  if(EXISTS "${root}/created-log-dir")
+    file(REMOVE_RECURSE "${E2E_LOG_DIR}" "${root}/created-log-dir")
   endif()
 endfunction()
 
-function(tool out rc)
-  execute_process(COMMAND ${EMULATOR} "${TOOL}" ${ARGN} OUTPUT_VARIABLE o ERROR_VARIABLE e RESULT_VARIABLE r TIMEOUT 100)
-  set(${out} "${o}" PARENT_SCOPE)
-  set(${rc} "${r}" PARENT_SCOPE)
-  set(tool_stderr "${e}" PARENT_SCOPE)
-endfunction()
-
-function(expect_tool expected_rc expected_regex)
-  tool(out rc ${ARGN})
-  if(NOT rc EQUAL expected_rc OR NOT out MATCHES "${expected_regex}")
-    e2e_fail("alertsummary ${ARGN}: exit ${rc}, output:\n${out}${tool_stderr}\nexpected exit ${expected_rc} and /${expected_regex}/")
-  endif()
-  set(tool_out "${out}" PARENT_SCOPE)
-  set(tool_stderr "${tool_stderr}" PARENT_SCOPE)
-endfunction()
-
-function(expect_usage)
-  tool(out rc ${ARGN})
-  string(REGEX MATCHALL "\n" newlines "${tool_stderr}")
-  list(LENGTH newlines lines)
-  if(NOT rc EQUAL 2 OR NOT out STREQUAL "" OR NOT lines EQUAL 1 OR NOT tool_stderr MATCHES "^alertsummary: ")
-    e2e_fail("alertsummary ${ARGN}: exit ${rc}, stdout '${out}', stderr '${tool_stderr}'; expected exit 2 and one line")
-  endif()
-endfunction()
-
-# The tool's collector lock is flock on Linux and LockFileEx under Wine, which
-# Wine keeps as a POSIX record lock: hold each the way the other side sees it.
-function(tool_lock_held out rc lock)
-  if(WINDOWS)
-    file(LOCK "${lock}" GUARD FUNCTION TIMEOUT 10)
-    tool(o r ${ARGN})
-  else()
-    find_program(FLOCK flock REQUIRED)
-    execute_process(COMMAND ${FLOCK} --nonblock "${lock}" "${TOOL}" ${ARGN}
-      OUTPUT_VARIABLE o ERROR_VARIABLE tool_stderr RESULT_VARIABLE r TIMEOUT 100)
-  endif()
-  set(${out} "${o}" PARENT_SCOPE)
-  set(${rc} "${r}" PARENT_SCOPE)
-  set(tool_stderr "${tool_stderr}" PARENT_SCOPE)
-endfunction()
-
-function(expect_json json expected)
-  set(keys ${ARGN})
-  list(GET keys -1 last)
-  if(last STREQUAL "LENGTH")
-    list(POP_BACK keys)
-    string(JSON got ERROR_VARIABLE error LENGTH "${json}" ${keys})
-  else()
-    string(JSON got ERROR_VARIABLE error GET "${json}" ${keys})
-  endif()
-  if(NOT "${got}" STREQUAL "${expected}")
-    e2e_fail("JSON ${ARGN}: '${got}' ${error}, expected '${expected}' in\n${json}")
-  endif()
-endfunction()
-
-set(E2E_SETTINGS "${WORK}/${CASE}.settings")
-set(E2E_SUITE_KEY "HKLM\\software\\Varnholt Suite\\Varnholt Suite")
-function(set_retention enabled days)
-  foreach(pair "Sch_Retention;${enabled}" "Sch_Retention_Val;${days}")
-    list(GET pair 0 name)
-    list(GET pair 1 value)
-    if(WINDOWS)
-      execute_process(COMMAND ${EMULATOR} reg add "${E2E_SUITE_KEY}\\${name}" /v ${name} /d "${value}" /f
-        OUTPUT_QUIET ERROR_QUIET RESULT_VARIABLE r)
-    else()
-      file(WRITE "${E2E_SETTINGS}/software/Varnholt Suite/Varnholt Suite/${name}/${name}" "${value}")
-    endif()
-  endforeach()
-endfunction()
-
-function(clear_retention)
-  file(REMOVE_RECURSE "${E2E_SETTINGS}")
-  file(MAKE_DIRECTORY "${E2E_SETTINGS}")
-  if(WINDOWS)
-    foreach(name Sch_Retention Sch_Retention_Val)
-      execute_process(COMMAND ${EMULATOR} reg delete "${E2E_SUITE_KEY}\\${name}" /f OUTPUT_QUIET ERROR_QUIET)
-    endforeach()
-  endif()
-endfunction()
-
-# At the top level of a script: skips the test when a program it needs is missing.
+# At the top level of a script: skips the test, with one line, when a program it needs is missing.
 macro(e2e_need var program why)
   find_program(${var} ${program})
   if(NOT ${var})
@@ -250,6 +90,111 @@ macro(e2e_need var program why)
   endif()
 endmacro()
 
+# Runs the host in ${install} with the steps given; its "wait" steps wait for the conditions of E2E_AWAIT
+# (separated by "|"), which the waiter above watches beside it.
+function(e2e_host out rc)
+  execute_process(COMMAND ${CMAKE_COMMAND} -DWINDOWS=${WINDOWS} "-DINSTALL=${install}" "-DCONDITIONS=${E2E_AWAIT}"
+      -P "${E2E_COMMON}"
+    COMMAND ${EMULATOR} "${install}/${E2E_HOST_NAME}" ${ARGN}
+    WORKING_DIRECTORY "${install}" OUTPUT_VARIABLE o ERROR_VARIABLE e RESULT_VARIABLE r TIMEOUT 130)
+  set(${out} "${o}${e}" PARENT_SCOPE)
+  set(${rc} "${r}" PARENT_SCOPE)
+endfunction()
+
+# Fails unless every alert file below `dir` has its PROC_ name.
+function(e2e_expect_all_marked dir)
+  file(GLOB_RECURSE left "${dir}/*.eml*")
+  list(FILTER left EXCLUDE REGEX "/PROC_[^/]*$")
+  if(left)
+    e2e_fail("files left unprocessed: ${left}")
+  endif()
+endfunction()
+
+# Runs the support tool; its output lands in tool_out, its stderr in tool_stderr.
+macro(tool rc)
+  execute_process(COMMAND ${EMULATOR} "${TOOL}" ${ARGN}
+    OUTPUT_VARIABLE tool_out ERROR_VARIABLE tool_stderr RESULT_VARIABLE ${rc} TIMEOUT 100)
+endmacro()
+
+function(expect_tool expected_rc expected_regex)
+  tool(rc ${ARGN})
+  if(NOT rc EQUAL expected_rc OR NOT tool_out MATCHES "${expected_regex}")
+    e2e_fail("alertsummary ${ARGN}: exit ${rc}, output:\n${tool_out}${tool_stderr}\n"
+      "expected exit ${expected_rc} and /${expected_regex}/")
+  endif()
+  set(tool_out "${tool_out}" PARENT_SCOPE)
+  set(tool_stderr "${tool_stderr}" PARENT_SCOPE)
+endfunction()
+
+# Fails unless the tool refuses the arguments (separated by "|") with exit 2, one line on stderr and no output.
+function(expect_usage args)
+  string(REPLACE "|" ";" args "${args}")
+  tool(rc ${args} ${ARGN})
+  if(NOT rc EQUAL 2 OR NOT tool_out STREQUAL "" OR NOT tool_stderr MATCHES "^alertsummary: [^\n]*\n$")
+    e2e_fail("alertsummary ${args} ${ARGN}: exit ${rc}, stdout '${tool_out}', stderr '${tool_stderr}'")
+  endif()
+endfunction()
+
+# Runs the tool while another process holds the collector lock: flock on Linux; under Wine LockFileEx, which
+# Wine keeps as a POSIX record lock, as CMake's file(LOCK) takes it.
+function(tool_lock_held rc)
+  if(WINDOWS)
+    file(LOCK "${install}/Alert_Summary/AlertSummaryDB.collector.lock" GUARD FUNCTION TIMEOUT 10)
+    tool(r ${ARGN})
+  else()
+    find_program(FLOCK flock REQUIRED)
+    execute_process(COMMAND ${FLOCK} --nonblock "${install}/Alert_Summary/AlertSummaryDB.collector.lock" "${TOOL}"
+      ${ARGN} OUTPUT_VARIABLE tool_out ERROR_VARIABLE tool_stderr RESULT_VARIABLE r TIMEOUT 100)
+  endif()
+  set(${rc} "${r}" PARENT_SCOPE)
+  set(tool_out "${tool_out}" PARENT_SCOPE)
+endfunction()
+
+# Fails unless each "key/key…=value" holds in the JSON; a last key LENGTH reads the length of what it follows.
+# Booleans read ON/OFF, null reads "".
+function(expect_json json)
+  foreach(check IN LISTS ARGN)
+    string(REGEX MATCH "^([^=]*)=(.*)$" check "${check}")
+    set(expected "${CMAKE_MATCH_2}")
+    string(REPLACE "/" ";" keys "${CMAKE_MATCH_1}")
+    set(how GET)
+    if(keys MATCHES ";LENGTH$")
+      list(POP_BACK keys)
+      set(how LENGTH)
+    endif()
+    string(JSON got ERROR_VARIABLE error ${how} "${json}" ${keys})
+    if(NOT "${got}" STREQUAL "${expected}")
+      e2e_fail("JSON ${check}: got '${got}' ${error} in\n${json}")
+    endif()
+  endforeach()
+endfunction()
+
+# The retention settings the tool reads: files below --settings-root on Linux, the registry under Wine.
+set(E2E_SUITE_KEY "HKLM\\software\\Varnholt Suite\\Varnholt Suite")
+function(set_retention enabled days)
+  foreach(pair "Sch_Retention;${enabled}" "Sch_Retention_Val;${days}")
+    list(GET pair 0 name)
+    list(GET pair 1 value)
+    if(WINDOWS)
+      execute_process(COMMAND ${EMULATOR} reg add "${E2E_SUITE_KEY}\\${name}" /v ${name} /d "${value}" /f
+        OUTPUT_QUIET ERROR_QUIET)
+    else()
+      file(WRITE "${E2E_SETTINGS}/software/Varnholt Suite/Varnholt Suite/${name}/${name}" "${value}")
+    endif()
+  endforeach()
+endfunction()
+
+function(clear_retention)
+  file(REMOVE_RECURSE "${E2E_SETTINGS}")
+  file(MAKE_DIRECTORY "${E2E_SETTINGS}")
+  foreach(name Sch_Retention Sch_Retention_Val)
+    if(WINDOWS)
+      execute_process(COMMAND ${EMULATOR} reg delete "${E2E_SUITE_KEY}\\${name}" /f OUTPUT_QUIET ERROR_QUIET)
+    endif()
+  endforeach()
+endfunction()
+
+# Runs statements with the sqlite3 program (found by e2e_need(SQLITE3 sqlite3 …)).
 function(sqlite out db sql)
   execute_process(COMMAND ${SQLITE3} "${db}" "${sql}" OUTPUT_VARIABLE o ERROR_VARIABLE e RESULT_VARIABLE r
     OUTPUT_STRIP_TRAILING_WHITESPACE)
@@ -257,16 +202,4 @@ function(sqlite out db sql)
     e2e_fail("sqlite3 ${sql}: ${e}")
   endif()
   set(${out} "${o}" PARENT_SCOPE)
-endfunction()
-
-# Days since 1970-01-01 of a date of the Gregorian calendar.
-function(days_from_civil out y m d)
-  if(m LESS_EQUAL 2)
-    math(EXPR y "${y} - 1")
-  endif()
-  math(EXPR era "${y} / 400")
-  math(EXPR yoe "${y} - ${era} * 400")
-  math(EXPR doy "(153 * ((${m} + 9) % 12) + 2) / 5 + ${d} - 1")
-  math(EXPR days "${era} * 146097 + ${yoe} * 365 + ${yoe} / 4 - ${yoe} / 100 + ${doy} - 719468")
-  set(${out} ${days} PARENT_SCOPE)
 endfunction()
