@@ -5,7 +5,7 @@ include(${CMAKE_CURRENT_LIST_DIR}/e2e_common.cmake)
 e2e_need(SQLITE3 sqlite3 "it seeds the faults")
 file(COPY "${SOURCE_DIR}/examples/install/" DESTINATION "${install}")
 set(db "${install}/Alert_Summary/AlertSummaryDB.db")
-clear_retention()
+set_retention()
 macro(audit expected_rc)
   expect_tool(${expected_rc} "" audit --install-dir "${install}" --settings-root "${E2E_SETTINGS}" --format json ${fix})
   expect_json("${tool_out}" ${ARGN})
@@ -51,7 +51,7 @@ audit(0 missing/LENGTH=0 duplicates/LENGTH=0 purged=${purged})
 
 # Retention switched off since: the purged files may have been purged under settings since changed, so they are
 # doubts, never missing. A row of an unusable date sorts first, yet proves nothing about what purges removed.
-clear_retention()
+set_retention()
 sqlite(ignored "${db}" "INSERT INTO AlertDB SELECT \"Alert Action\", \"Alert Type\", \"Alert Name\", '-1/-1/-1 -1:-1:-1',
   \"Threshold\", \"Who\", \"Operation\", \"Component Name\", \"EmailStatus\", \"Server Name\", 'gone.eml' FROM AlertDB LIMIT 1")
 audit(0 purged=0 unsure/LENGTH=${purged} missing/LENGTH=0 rows_without_file=1)
