@@ -4,7 +4,7 @@
 # deep MIME nesting and tables, a huge header, very many headers, junk and an empty file. The process neither
 # crashes nor hangs, and every file ends marked, three with a row.
 include(${CMAKE_CURRENT_LIST_DIR}/e2e_common.cmake)
-e2e_need(SQLITE3 sqlite3 "the stored rows are read with it")
+e2e_need(SQLITE3 sqlite3)
 file(COPY "${HOST}" "${LIBRARY}" "${SOURCE_DIR}/examples/install/" DESTINATION "${install}")
 set(all "<FROM></FROM><TO>9999/99/99 99:99:99</TO>")
 set(june "<FROM>2026/06/01 00:00:00</FROM><TO>2026/06/30 23:59:59</TO>")
