@@ -6,20 +6,18 @@ if(WINDOWS)
   set(E2E_LOG_DIR "$ENV{WINEPREFIX}/drive_c/AlertSummaryDbg")
 endif()
 if(DEFINED CONDITIONS)
-  # Run by e2e_host beside the host: one line to the host as each condition holds, in turn: "log:TEXT" (the log
+  # Run by e2e_host beside the host: a line to the host as each condition holds, in turn: "log:TEXT" (the log
   # holds TEXT) or "marked:N" (N files below the install folder have their PROC_ name). The deadline is a safety
-  # net only: the host then reads the end of its input, goes on, and the test fails on what it finds.
-  string(TIMESTAMP deadline "%s")
-  math(EXPR deadline "${deadline} + 100")
+  # net only: the host then goes on at once, and the test fails on what it finds.
+  string(TIMESTAMP now "%s")
+  math(EXPR deadline "${now} + 100")
   string(REPLACE "|" ";" CONDITIONS "${CONDITIONS}")
   foreach(condition IN LISTS CONDITIONS)
     set(found -1)
-    while(found LESS 0)
+    while(found LESS 0 AND now LESS deadline)
       execute_process(COMMAND ${CMAKE_COMMAND} -E sleep 0.1)
       string(TIMESTAMP now "%s")
-      if(now GREATER deadline)
-        return()
-      elseif(condition MATCHES "^log:(.*)" AND EXISTS "${E2E_LOG_DIR}/ErrorLog.txt")
+      if(condition MATCHES "^log:(.*)" AND EXISTS "${E2E_LOG_DIR}/ErrorLog.txt")
         file(READ "${E2E_LOG_DIR}/ErrorLog.txt" log)
         string(FIND "${log}" "${CMAKE_MATCH_1}" found)
       elseif(condition MATCHES "^marked:(.*)")
@@ -32,23 +30,11 @@ if(DEFINED CONDITIONS)
   endforeach()
   return()
 endif()
-
 set(root "${WORK}/${CASE}")
 set(install "${root}/install")
 set(E2E_SETTINGS "${root}/settings")
 file(REMOVE_RECURSE "${root}")
 file(MAKE_DIRECTORY "${install}")
-
-function(e2e_log_end)  # switches the log off again if e2e_log_begin switched it on
-  if(EXISTS "${root}/created-log-dir")
-    file(REMOVE_RECURSE "${E2E_LOG_DIR}" "${root}/created-log-dir")
-  endif()
-endfunction()
-
-function(e2e_fail text)
-  e2e_log_end()
-  message(FATAL_ERROR "${text}")
-endfunction()
 
 # At a script's top level: skips the test, with one line, when a program it needs is missing.
 macro(e2e_need var program)
@@ -72,8 +58,19 @@ macro(e2e_log_begin)
   file(REMOVE "${E2E_LOG_DIR}/ErrorLog.txt")
 endmacro()
 
+function(e2e_log_end)  # switches the log off again if e2e_log_begin switched it on
+  if(EXISTS "${root}/created-log-dir")
+    file(REMOVE_RECURSE "${E2E_LOG_DIR}" "${root}/created-log-dir")
+  endif()
+endfunction()
+
+function(e2e_fail text)
+  e2e_log_end()
+  message(FATAL_ERROR "${text}")
+endfunction()
+
 # Runs the host in ${install} with the steps given; its "wait" steps wait for the conditions of E2E_AWAIT
-# (separated by "|"), which this file watches beside it.
+# ("|" between them), which this file watches beside it.
 function(e2e_host out rc)
   file(GLOB host "${install}/testhost*")
   execute_process(COMMAND ${CMAKE_COMMAND} -DWINDOWS=${WINDOWS} "-DINSTALL=${install}" "-DCONDITIONS=${E2E_AWAIT}"
@@ -84,7 +81,7 @@ function(e2e_host out rc)
 endfunction()
 
 # Runs the support tool (after `prefix`, a lock holder) into tool_out and tool_stderr; fails unless it exits
-# `expected_rc` (2: and says one line on stderr, nothing else) and its output matches `regex`.
+# `expected_rc` (for 2: with one line on stderr and nothing else) and its output matches `regex`.
 function(expect_tool expected_rc regex)
   execute_process(COMMAND ${prefix} ${EMULATOR} "${TOOL}" ${ARGN}
     OUTPUT_VARIABLE out ERROR_VARIABLE err RESULT_VARIABLE rc TIMEOUT 100)
@@ -106,7 +103,6 @@ function(expect_tool_locked rc regex)
     set(prefix flock --nonblock "${lock}")
   endif()
   expect_tool(${rc} "${regex}" ${ARGN})
-  set(tool_out "${tool_out}" PARENT_SCOPE)
 endfunction()
 
 # Fails unless each "key/key…=value" holds in the JSON (a last key LENGTH reads the length of what it follows).
