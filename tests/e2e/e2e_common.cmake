@@ -35,15 +35,7 @@ set(install "${root}/install")
 set(E2E_SETTINGS "${root}/settings")
 file(REMOVE_RECURSE "${root}")
 file(MAKE_DIRECTORY "${install}")
-
-# At a script's top level: skips the test, with one line, when a program it needs is missing.
-macro(e2e_need var program)
-  find_program(${var} ${program})
-  if(NOT ${var})
-    message(STATUS "SKIPPED: no ${program} on this machine")
-    return()
-  endif()
-endmacro()
+find_program(SQLITE3 sqlite3 REQUIRED)
 
 # At a script's top level: switches the library's debug log on, empty, or skips the test where it cannot.
 macro(e2e_log_begin)
@@ -80,29 +72,22 @@ function(e2e_host out rc)
   set(${rc} "${r}" PARENT_SCOPE)
 endfunction()
 
-# Runs the support tool (after `prefix`, a lock holder) into tool_out and tool_stderr; fails unless it exits
-# `expected_rc` (for 2: with one line on stderr and nothing else) and its output matches `regex`.
+# Runs the support tool into tool_out; fails unless it exits `expected_rc` (2: with one line on stderr and nothing
+# else) and its output, stderr after stdout, matches `regex`. With `locked` on, another process holds the collector
+# lock meanwhile: flock on Linux; under Wine LockFileEx, which Wine keeps as a POSIX record lock, as file(LOCK) does.
 function(expect_tool expected_rc regex)
-  execute_process(COMMAND ${prefix} ${EMULATOR} "${TOOL}" ${ARGN}
-    OUTPUT_VARIABLE out ERROR_VARIABLE err RESULT_VARIABLE rc TIMEOUT 100)
-  if(NOT rc EQUAL expected_rc OR NOT out MATCHES "${regex}" OR expected_rc EQUAL 2 AND
+  set(lock "${install}/Alert_Summary/AlertSummaryDB.collector.lock")
+  if(locked AND WINDOWS)
+    file(LOCK "${lock}" GUARD FUNCTION TIMEOUT 10)
+  elseif(locked)
+    set(EMULATOR flock --nonblock "${lock}")
+  endif()
+  execute_process(COMMAND ${EMULATOR} "${TOOL}" ${ARGN} OUTPUT_VARIABLE out ERROR_VARIABLE err RESULT_VARIABLE rc)
+  if(NOT rc EQUAL expected_rc OR NOT "${out}${err}" MATCHES "${regex}" OR expected_rc EQUAL 2 AND
       (NOT out STREQUAL "" OR NOT err MATCHES "^alertsummary: [^\n]*\n$"))
     e2e_fail("alertsummary ${ARGN}: exit ${rc}, output:\n${out}${err}\nexpected exit ${expected_rc} and /${regex}/")
   endif()
   set(tool_out "${out}" PARENT_SCOPE)
-  set(tool_stderr "${err}" PARENT_SCOPE)
-endfunction()
-
-# expect_tool while another process holds the collector lock: flock on Linux; under Wine LockFileEx, which Wine
-# keeps as a POSIX record lock, as CMake's file(LOCK) takes it.
-function(expect_tool_locked rc regex)
-  set(lock "${install}/Alert_Summary/AlertSummaryDB.collector.lock")
-  if(WINDOWS)
-    file(LOCK "${lock}" GUARD FUNCTION TIMEOUT 10)
-  else()
-    set(prefix flock --nonblock "${lock}")
-  endif()
-  expect_tool(${rc} "${regex}" ${ARGN})
 endfunction()
 
 # Fails unless each "key/key…=value" holds in the JSON (a last key LENGTH reads the length of what it follows).

@@ -3,7 +3,6 @@
 # Then files nested deeper than any reader descends, processed on the library's own thread with the 1 MiB stack
 # of a typical service (Windows): the process neither crashes nor hangs, and both end marked, one with a row.
 include(${CMAKE_CURRENT_LIST_DIR}/e2e_common.cmake)
-e2e_need(SQLITE3 sqlite3)
 file(COPY "${HOST}" "${LIBRARY}" "${SOURCE_DIR}/examples/install/" DESTINATION "${install}")
 set(all "<FROM></FROM><TO>9999/99/99 99:99:99</TO>")
 set(june "<FROM>2026/06/01 00:00:00</FROM><TO>2026/06/30 23:59:59</TO>")

@@ -2,7 +2,6 @@
 # code 0 and no alert lost. Linux stops the thread at unload and at exit; Windows keeps the library mapped while
 # its thread runs, so there the thread goes on after the unload until every file is marked.
 include(${CMAKE_CURRENT_LIST_DIR}/e2e_common.cmake)
-e2e_need(SQLITE3 sqlite3)
 foreach(stop exit unload)
   file(REMOVE_RECURSE "${install}")
   file(COPY "${HOST}" "${LIBRARY}" "${SOURCE_DIR}/examples/install/" DESTINATION "${install}")
