@@ -36,8 +36,8 @@ set(E2E_SETTINGS "${root}/settings")
 file(REMOVE_RECURSE "${root}")
 file(MAKE_DIRECTORY "${install}")
 find_program(SQLITE3 sqlite3 REQUIRED)
-
-# At a script's top level: switches the library's debug log on, empty, or skips the test where it cannot.
+# At a script's top level: switches the library's debug log on, empty, or skips the test where it cannot;
+# e2e_log_end (and e2e_fail) switch it off again if it was off.
 macro(e2e_log_begin)
   if(NOT EXISTS "${E2E_LOG_DIR}")
     file(MAKE_DIRECTORY "${E2E_LOG_DIR}")
@@ -45,22 +45,19 @@ macro(e2e_log_begin)
       message(STATUS "SKIPPED: cannot create the debug log folder ${E2E_LOG_DIR} (run as root)")
       return()
     endif()
-    file(WRITE "${root}/created-log-dir" "")
+    set(E2E_LOG_WAS_OFF ON)
   endif()
   file(REMOVE "${E2E_LOG_DIR}/ErrorLog.txt")
 endmacro()
-
-function(e2e_log_end)  # switches the log off again if e2e_log_begin switched it on
-  if(EXISTS "${root}/created-log-dir")
-    file(REMOVE_RECURSE "${E2E_LOG_DIR}" "${root}/created-log-dir")
+macro(e2e_log_end)
+  if(E2E_LOG_WAS_OFF)
+    file(REMOVE_RECURSE "${E2E_LOG_DIR}")
   endif()
-endfunction()
-
+endmacro()
 function(e2e_fail text)
   e2e_log_end()
   message(FATAL_ERROR "${text}")
 endfunction()
-
 # Runs the host in ${install} with the steps given; its "wait" steps wait for the conditions of E2E_AWAIT
 # ("|" between them), which this file watches beside it.
 function(e2e_host out rc)
@@ -71,7 +68,6 @@ function(e2e_host out rc)
   set(${out} "${o}${e}" PARENT_SCOPE)
   set(${rc} "${r}" PARENT_SCOPE)
 endfunction()
-
 # Runs the support tool into tool_out; fails unless it exits `expected_rc` (2: with one line on stderr and nothing
 # else) and its output, stderr after stdout, matches `regex`. With `locked` on, another process holds the collector
 # lock meanwhile: flock on Linux; under Wine LockFileEx, which Wine keeps as a POSIX record lock, as file(LOCK) does.
@@ -89,7 +85,6 @@ function(expect_tool expected_rc regex)
   endif()
   set(tool_out "${out}" PARENT_SCOPE)
 endfunction()
-
 # Fails unless each "key/key…=value" holds in the JSON (a last key LENGTH reads the length of what it follows).
 # Booleans read ON/OFF, null reads "".
 function(expect_json json)
@@ -108,7 +103,6 @@ function(expect_json json)
     endif()
   endforeach()
 endfunction()
-
 # The retention settings the tool reads (none without arguments): files below --settings-root on Linux, the
 # registry under Wine.
 function(set_retention)
@@ -125,7 +119,6 @@ function(set_retention)
     endif()
   endforeach()
 endfunction()
-
 function(sqlite out db sql)
   execute_process(COMMAND ${SQLITE3} "${db}" "${sql}" OUTPUT_VARIABLE o OUTPUT_STRIP_TRAILING_WHITESPACE
     COMMAND_ERROR_IS_FATAL ANY)

@@ -1,11 +1,8 @@
-# The support tool as a person runs it: help on every subcommand; bad input refused (one line on stderr, exit 2,
-# nothing written); one cycle over the example, then counts, reports, inspect and the index, with the tool's own
-# texts; count, report, status, audit and inspect create and change nothing and keep out of the service's log.
-# Then status and audit over a store in trouble: status tells what waits and for how long, the database, the
-# collector lock held by another process and retention. audit finds one row lost and another stored twice beside
-# marked files and alerts that retention purged (neither missing); --fix and one cycle mend it; with retention
-# switched off the purged files are doubts, never missing, and a row of an unusable date (sorting first) proves
-# nothing about them.
+# The support tool as a person runs it: bad input refused (one line on stderr, exit 2, nothing written), then
+# one cycle over the example and every command, with the tool's own texts; the readers create and change nothing
+# and keep out of the service's log. Then status (what waits and how long, the held lock, retention) and audit over
+# a store that lost one row and holds another twice, beside marked files and alerts retention purged (neither is
+# missing); --fix and a cycle mend it; with retention off purged files are doubts, never missing.
 include(${CMAKE_CURRENT_LIST_DIR}/e2e_common.cmake)
 file(COPY "${SOURCE_DIR}/examples/install/" DESTINATION "${install}")
 set(in --install-dir "${install}" --settings-root "${E2E_SETTINGS}")
@@ -40,36 +37,29 @@ endforeach()
 expect(status 0 pending_total=38 database/exists=OFF collector=free log/on=ON retention/enabled=OFF retention/days=15)
 expect_tool(0 "\"loaded\":true.*\"outcome\":\"stored\".*\"row\":\\{\"Alert Action\":\"Email Alert\"" inspect "${alert}")
 expect_tool(1 "\"loaded\":false.*\"outcome\":\"left\"" inspect "${install}")
-file(GLOB written "${install}/Alert_Summary" "${root}/page.html" "${E2E_SETTINGS}" "${E2E_LOG_DIR}/ErrorLog.txt")
-if(written)
-  e2e_fail("a reader or a refused command wrote ${written}")
-endif()
+file(GLOB early "${install}/Alert_Summary" "${root}/page.html")
 
 expect_tool(0 "^stored 36, marked 2, left 0\n$" collect --once ${in} --log-dir "${root}")
 expect_tool(0 "^stored 0, marked 0, left 0\n$" collect --once ${in} --log-dir "${root}")
 file(REMOVE "${install}/Alert_Summary/AlertSummaryDB.collector.lock" "${root}/ErrorLog.txt")
 file(SHA256 "${db}" before)
 expect_tool(0 "^36\n$" count ${in})
-expect_tool(0 "^10\n$" count ${in} --filter "Script Alert")
 expect_tool(0 "^2\n$" count ${in} ${june})
 expect_tool(0 "^2\n$" count ${in} --range "<FROM>2026/06/01 00:00:00</FROM><TO>2026/06/30 23:59:59</TO>")
 expect_tool(0 "36 alert\\(s\\)\n$" report ${in})
 expect_tool(0 "^Alert Action,Alert Type,Component Name,EmailStatus,Count\n" report ${in} --format csv)
 expect_tool(0 "\"Count\": " report ${in} --format json)
-expect_tool(0 "</html>" report ${in} --format html)
 expect_tool(0 "collector  free" status ${in})
 expect_tool(0 "." audit ${in})
 expect_tool(0 "\"loaded\":true" inspect "${alert}" --log-dir "${root}")
 file(SHA256 "${db}" after)
 file(GLOB written "${install}/Alert_Summary/*.lock" "${E2E_SETTINGS}" "${E2E_LOG_DIR}/ErrorLog.txt")
-if(written OR NOT before STREQUAL after OR NOT EXISTS "${root}/ErrorLog.txt")
-  e2e_fail("a reader wrote ${written} or changed the database, or inspect --log-dir wrote no log")
+if(early OR written OR NOT before STREQUAL after OR NOT EXISTS "${root}/ErrorLog.txt")
+  e2e_fail("a reader wrote ${early} ${written} or changed the database, or inspect --log-dir wrote no log")
 endif()
 expect_tool(0 "retention is off" purge ${in})
-# The index on "When": counts stay the same with it, and it goes again.
 expect_tool(0 "^added the index" optimize ${in})
 expect_tool(0 "\"when_index\": true" status ${in} --format json)
-expect_tool(0 "^2\n$" count ${in} ${june})
 expect_tool(0 "^removed the index" optimize ${in} --undo)
 
 # One alert arrives late; it was written two hours ago.

@@ -19,18 +19,14 @@ k(i) AS (SELECT 1 UNION ALL SELECT i + 1 FROM k WHERE i < \\3) SELECT 'Email Ale
 string(REPLACE "'none 10:00:00'" "'-1/-1/-1 -1:-1:-1'" sql "${sql}")
 expect_tool(0 "" collect --once --install-dir "${install}")
 sqlite(ignored "${install}/Alert_Summary/AlertSummaryDB.db" "${sql}")
-expect_tool(0 "" report --install-dir "${install}" --format html --output "${root}/page.html"
-  --made-at "2026/03/05 08:00:00" --install-label "Fixture install")
+expect_tool(0 "" report --install-dir "${install}" --format html --output "${root}/page.html")
 # The probe writes what the browser drew into attributes, in thousandths of a pixel.
 file(READ "${root}/page.html" page)
 string(REPLACE "default-src 'none';" "default-src 'none'; script-src 'unsafe-inline';" page "${page}")
-string(REPLACE "</body>" "<script>
-for (const e of document.querySelectorAll('[data-count]')) {
-  const r = e.getBoundingClientRect();
-  e.setAttribute('data-drawn', Math.round(1000 * (e.classList.contains('bar') ? r.width : r.height)));
-  e.setAttribute('data-left', Math.round(1000 * r.left));
-}
-</script></body>" page "${page}")
+string(REPLACE "</body>" "<script>for (const e of document.querySelectorAll('[data-count]')) {
+  const r = e.getBoundingClientRect(), bar = e.classList.contains('bar');
+  e.setAttribute('data-drawn', Math.round(1000 * (bar ? r.width : r.height)));
+  e.setAttribute('data-left', Math.round(1000 * r.left)); }</script></body>" page "${page}")
 file(WRITE "${root}/probe.html" "${page}")
 string(REPLACE " " "%20" url "file://${root}/probe.html")
 execute_process(COMMAND ${CHROMIUM} --headless --no-sandbox --disable-gpu --no-first-run --disable-sync
