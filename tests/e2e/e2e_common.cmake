@@ -1,14 +1,12 @@
-# Shared steps of the end-to-end scripts. Each works in its own folder, made afresh: ${root}, with the install
-# folder ${install} and the settings tree ${E2E_SETTINGS} (the tool's --settings-root on Linux).
+# Shared steps of the end-to-end scripts, each in its own folder ${root}, made afresh.
 set(E2E_COMMON "${CMAKE_CURRENT_LIST_FILE}")
 set(E2E_LOG_DIR "/var/log/AlertSummaryDbg")
 if(WINDOWS)
   set(E2E_LOG_DIR "$ENV{WINEPREFIX}/drive_c/AlertSummaryDbg")
 endif()
 if(DEFINED CONDITIONS)
-  # Run by e2e_host beside the host: a line to the host as each condition holds, in turn: "log:TEXT" (the log
-  # holds TEXT) or "marked:N" (N files below the install folder have their PROC_ name). The deadline is a safety
-  # net only: the host then goes on at once, and the test fails on what it finds.
+  # Beside the host (e2e_host): a line to it as each condition holds in turn, "log:TEXT" (the log holds TEXT) or
+  # "marked:N" (N files have their PROC_ name). The deadline is a safety net: the test fails on what it finds.
   string(TIMESTAMP now "%s")
   math(EXPR deadline "${now} + 100")
   string(REPLACE "|" ";" CONDITIONS "${CONDITIONS}")
@@ -36,8 +34,7 @@ set(E2E_SETTINGS "${root}/settings")
 file(REMOVE_RECURSE "${root}")
 file(MAKE_DIRECTORY "${install}")
 find_program(SQLITE3 sqlite3 REQUIRED)
-# At a script's top level: switches the library's debug log on, empty, or skips the test where it cannot;
-# e2e_log_end (and e2e_fail) switch it off again if it was off.
+# At a script's top level: the library's debug log on and empty (or the test skipped), until e2e_log_end.
 macro(e2e_log_begin)
   if(NOT EXISTS "${E2E_LOG_DIR}")
     file(MAKE_DIRECTORY "${E2E_LOG_DIR}")
@@ -58,8 +55,7 @@ function(e2e_fail text)
   e2e_log_end()
   message(FATAL_ERROR "${text}")
 endfunction()
-# Runs the host in ${install} with the steps given; its "wait" steps wait for the conditions of E2E_AWAIT
-# ("|" between them), which this file watches beside it.
+# Runs the host in ${install}; its "wait" steps wait for the conditions of E2E_AWAIT ("|" between them).
 function(e2e_host out rc)
   file(GLOB host "${install}/testhost*")
   execute_process(COMMAND ${CMAKE_COMMAND} -DWINDOWS=${WINDOWS} "-DINSTALL=${install}" "-DCONDITIONS=${E2E_AWAIT}"
@@ -85,26 +81,21 @@ function(expect_tool expected_rc regex)
   endif()
   set(tool_out "${out}" PARENT_SCOPE)
 endfunction()
-# Fails unless each "key/key…=value" holds in the JSON (a last key LENGTH reads the length of what it follows).
-# Booleans read ON/OFF, null reads "".
+# Fails unless each "key/key…=value" holds in the JSON ("key/LENGTH=n": its length; ON/OFF for booleans).
 function(expect_json json)
   foreach(check IN LISTS ARGN)
-    string(REGEX MATCH "^(([^=]*)/LENGTH|[^=]*)=(.*)$" check "${check}")
-    set(how GET)
-    set(keys "${CMAKE_MATCH_1}")
-    if(NOT "${CMAKE_MATCH_2}" STREQUAL "")
-      set(how LENGTH)
-      set(keys "${CMAKE_MATCH_2}")
-    endif()
+    string(REGEX MATCH "^([^=]*)=(.*)$" check "${check}")
+    set(expected "${CMAKE_MATCH_2}")
+    string(REGEX REPLACE "^GET;(.*)/LENGTH$" "LENGTH;\\1" keys "GET;${CMAKE_MATCH_1}")
     string(REPLACE "/" ";" keys "${keys}")
+    list(POP_FRONT keys how)
     string(JSON got ERROR_VARIABLE error ${how} "${json}" ${keys})
-    if(NOT "${got}" STREQUAL "${CMAKE_MATCH_3}")
+    if(NOT "${got}" STREQUAL "${expected}")
       e2e_fail("JSON ${check}: got '${got}' ${error} in\n${json}")
     endif()
   endforeach()
 endfunction()
-# The retention settings the tool reads (none without arguments): files below --settings-root on Linux, the
-# registry under Wine.
+# The retention settings the tool reads, none without arguments (Linux: --settings-root ${E2E_SETTINGS}).
 function(set_retention)
   file(REMOVE_RECURSE "${E2E_SETTINGS}")
   set(names Sch_Retention Sch_Retention_Val)

@@ -13,14 +13,13 @@ foreach(stop exit unload)
     endforeach()
   endforeach()
   set(E2E_AWAIT "marked:1")
-  set(steps ${stop})
   if(stop STREQUAL "unload" AND WINDOWS)
     set(E2E_AWAIT "marked:1|marked:380")
-    set(steps unload wait)
+    set(stop "unload;wait")
   endif()
-  e2e_host(output rc count @empty @empty run wait ${steps} exit)
-  # Each file is untouched or marked, with its row unless it is the malformed or the empty example. Windows may
-  # end the thread between an insert and its rename, which leaves one row more.
+  e2e_host(output rc count @empty @empty run wait ${stop} exit)
+  # Each file untouched or marked, with its row but for the malformed and the empty example (Windows may end
+  # the thread between an insert and its rename: one row more).
   file(GLOB_RECURSE all "${install}/*.eml")
   file(GLOB_RECURSE marked "${install}/PROC_*.eml")
   list(FILTER marked EXCLUDE REGEX "Alert_(malformed|empty)\\.eml$")

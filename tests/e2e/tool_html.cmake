@@ -1,7 +1,5 @@
-# The HTML report as a browser builds it: a fixture database with counts this test knows, the page opened in
-# headless Chromium with a probe script beside its own style policy, and the charts read back from the DOM the
-# browser made: every stacked piece, the totals and the performers carry the fixture's counts, the drawn sizes
-# are proportional to them, and a day without alerts keeps its place on the axis.
+# The HTML report of a fixture as headless Chromium builds it, read back from its DOM: the charts carry the
+# fixture's counts, drawn to one scale, and a day without alerts keeps its place on the axis.
 include(${CMAKE_CURRENT_LIST_DIR}/e2e_common.cmake)
 find_program(CHROMIUM chromium)
 if(NOT CHROMIUM)
@@ -20,7 +18,7 @@ string(REPLACE "'none 10:00:00'" "'-1/-1/-1 -1:-1:-1'" sql "${sql}")
 expect_tool(0 "" collect --once --install-dir "${install}")
 sqlite(ignored "${install}/Alert_Summary/AlertSummaryDB.db" "${sql}")
 expect_tool(0 "" report --install-dir "${install}" --format html --output "${root}/page.html")
-# The probe writes what the browser drew into attributes, in thousandths of a pixel.
+# Beside the page's own style policy, a probe writes what the browser drew into attributes, in thousandths of a pixel.
 file(READ "${root}/page.html" page)
 string(REPLACE "default-src 'none';" "default-src 'none'; script-src 'unsafe-inline';" page "${page}")
 string(REPLACE "</body>" "<script>for (const e of document.querySelectorAll('[data-count]')) {
@@ -36,7 +34,7 @@ if(NOT r EQUAL 0 OR NOT dom MATCHES "</html>")
   e2e_fail("chromium on ${root}/probe.html: exit ${r}\n${errors}")
 endif()
 
-# Appends to `out` the `replacement` of each element that matches `element` (a regex of its attributes).
+# Appends to `out` the `replacement` of each element matching `element` (a regex of its attributes).
 function(read_back out element replacement)
   string(REGEX MATCHALL "${element}[^>]*>" rows "${dom}")
   list(TRANSFORM rows REPLACE "${element}[^>]*>" "${replacement}")
