@@ -1,5 +1,4 @@
 # Shared steps of the end-to-end scripts, each in its own folder ${root}, made afresh.
-set(E2E_COMMON "${CMAKE_CURRENT_LIST_FILE}")
 set(E2E_LOG_DIR "/var/log/AlertSummaryDbg")
 if(WINDOWS)
   set(E2E_LOG_DIR "$ENV{WINEPREFIX}/drive_c/AlertSummaryDbg")
@@ -9,7 +8,6 @@ if(DEFINED CONDITIONS)
   # "marked:N" (N files have their PROC_ name). The deadline is a safety net: the test fails on what it finds.
   string(TIMESTAMP now "%s")
   math(EXPR deadline "${now} + 100")
-  string(REPLACE "|" ";" CONDITIONS "${CONDITIONS}")
   foreach(condition IN LISTS CONDITIONS)
     set(found -1)
     while(found LESS 0 AND now LESS deadline)
@@ -33,7 +31,6 @@ set(install "${root}/install")
 set(E2E_SETTINGS "${root}/settings")
 file(REMOVE_RECURSE "${root}")
 file(MAKE_DIRECTORY "${install}")
-find_program(SQLITE3 sqlite3 REQUIRED)
 # At a script's top level: the library's debug log on and empty (or the test skipped), until e2e_log_end.
 macro(e2e_log_begin)
   if(NOT EXISTS "${E2E_LOG_DIR}")
@@ -42,12 +39,12 @@ macro(e2e_log_begin)
       message(STATUS "SKIPPED: cannot create the debug log folder ${E2E_LOG_DIR} (run as root)")
       return()
     endif()
-    set(E2E_LOG_WAS_OFF ON)
+    set(E2E_LOG_CREATED "${E2E_LOG_DIR}")
   endif()
   file(REMOVE "${E2E_LOG_DIR}/ErrorLog.txt")
 endmacro()
 macro(e2e_log_end)
-  if(E2E_LOG_WAS_OFF)
+  if(E2E_LOG_CREATED)
     file(REMOVE_RECURSE "${E2E_LOG_DIR}")
   endif()
 endmacro()
@@ -55,11 +52,11 @@ function(e2e_fail text)
   e2e_log_end()
   message(FATAL_ERROR "${text}")
 endfunction()
-# Runs the host in ${install}; its "wait" steps wait for the conditions of E2E_AWAIT ("|" between them).
+# Runs the host in ${install}; its "wait" steps wait for the conditions listed in E2E_AWAIT.
 function(e2e_host out rc)
   file(GLOB host "${install}/testhost*")
   execute_process(COMMAND ${CMAKE_COMMAND} -DWINDOWS=${WINDOWS} "-DINSTALL=${install}" "-DCONDITIONS=${E2E_AWAIT}"
-      -P "${E2E_COMMON}" COMMAND ${EMULATOR} ${host} ${ARGN}
+      -P "${CMAKE_CURRENT_LIST_DIR}/e2e_common.cmake" COMMAND ${EMULATOR} ${host} ${ARGN}
     WORKING_DIRECTORY "${install}" OUTPUT_VARIABLE o ERROR_VARIABLE e RESULT_VARIABLE r TIMEOUT 130)
   set(${out} "${o}${e}" PARENT_SCOPE)
   set(${rc} "${r}" PARENT_SCOPE)
@@ -68,11 +65,10 @@ endfunction()
 # else) and its output, stderr after stdout, matches `regex`. With `locked` on, another process holds the collector
 # lock meanwhile: flock on Linux; under Wine LockFileEx, which Wine keeps as a POSIX record lock, as file(LOCK) does.
 function(expect_tool expected_rc regex)
-  set(lock "${install}/Alert_Summary/AlertSummaryDB.collector.lock")
   if(locked AND WINDOWS)
-    file(LOCK "${lock}" GUARD FUNCTION TIMEOUT 10)
+    file(LOCK "${install}/Alert_Summary/AlertSummaryDB.collector.lock" GUARD FUNCTION TIMEOUT 10)
   elseif(locked)
-    set(EMULATOR flock --nonblock "${lock}")
+    set(EMULATOR flock --nonblock "${install}/Alert_Summary/AlertSummaryDB.collector.lock")
   endif()
   execute_process(COMMAND ${EMULATOR} "${TOOL}" ${ARGN} OUTPUT_VARIABLE out ERROR_VARIABLE err RESULT_VARIABLE rc)
   if(NOT rc EQUAL expected_rc OR NOT "${out}${err}" MATCHES "${regex}" OR expected_rc EQUAL 2 AND
@@ -111,7 +107,7 @@ function(set_retention)
   endforeach()
 endfunction()
 function(sqlite out db sql)
-  execute_process(COMMAND ${SQLITE3} "${db}" "${sql}" OUTPUT_VARIABLE o OUTPUT_STRIP_TRAILING_WHITESPACE
+  execute_process(COMMAND sqlite3 "${db}" "${sql}" OUTPUT_VARIABLE o OUTPUT_STRIP_TRAILING_WHITESPACE
     COMMAND_ERROR_IS_FATAL ANY)
   set(${out} "${o}" PARENT_SCOPE)
 endfunction()

@@ -1,6 +1,5 @@
-# The library exports exactly _Run, _GetAlertCount and _RunRetentionProc (a DLL's export table as objdump reads it,
-# a shared object's defined dynamic symbols as nm lists them). On Windows the host and the tool carry an asInvoker
-# manifest: an unelevated program without one would be virtualised.
+# The library exports exactly _Run, _GetAlertCount and _RunRetentionProc. On Windows the host and the tool carry
+# an asInvoker manifest: an unelevated program without one would be virtualised.
 execute_process(COMMAND nm -D --defined-only ${LIBRARY} OUTPUT_VARIABLE dump ERROR_QUIET)
 if(WINDOWS)
   execute_process(COMMAND ${OBJDUMP} -p ${LIBRARY} OUTPUT_VARIABLE dump)

@@ -23,10 +23,10 @@ if(WINDOWS)  # every way the service hands over its string objects, on the store
 endif()
 file(GLOB_RECURSE left "${install}/*.eml")
 list(FILTER left EXCLUDE REGEX "/PROC_[^/]*$")
-execute_process(COMMAND ${SQLITE3} -separator " | " "${install}/Alert_Summary/AlertSummaryDB.db"
+execute_process(COMMAND sqlite3 -separator " | " "${install}/Alert_Summary/AlertSummaryDB.db"
   INPUT_FILE "${CMAKE_CURRENT_LIST_DIR}/rows.sql" OUTPUT_FILE "${root}/rows.txt")
-execute_process(COMMAND ${CMAKE_COMMAND} -E compare_files "${root}/rows.txt" "${CMAKE_CURRENT_LIST_DIR}/example_rows.txt"
-  RESULT_VARIABLE rows_differ)
+execute_process(COMMAND ${CMAKE_COMMAND} -E compare_files "${root}/rows.txt"
+  "${CMAKE_CURRENT_LIST_DIR}/example_rows.txt" RESULT_VARIABLE rows_differ)
 if(NOT rc EQUAL 0 OR NOT output STREQUAL expected OR left OR rows_differ)
   e2e_fail("exit ${rc}, the host printed:\n${output}\nexpected:\n${expected}\nunmarked: ${left}\n"
     "the stored rows: ${root}/rows.txt against example_rows.txt")

@@ -1,6 +1,5 @@
-# _Run over a backlog, then, while the first cycle works through it, a normal exit() or an unload and an exit:
-# code 0 and no alert lost. Linux stops the thread at unload and at exit; Windows keeps the library mapped while
-# its thread runs, so there the thread goes on after the unload until every file is marked.
+# _Run over a backlog, then, while the first cycle works on it, exit() or an unload and exit(): code 0, no alert
+# lost. Linux stops the thread at both; Windows keeps the library mapped, so its thread goes on to mark every file.
 include(${CMAKE_CURRENT_LIST_DIR}/e2e_common.cmake)
 foreach(stop exit unload)
   file(REMOVE_RECURSE "${install}")
@@ -14,12 +13,12 @@ foreach(stop exit unload)
   endforeach()
   set(E2E_AWAIT "marked:1")
   if(stop STREQUAL "unload" AND WINDOWS)
-    set(E2E_AWAIT "marked:1|marked:380")
+    set(E2E_AWAIT marked:1 marked:380)
     set(stop "unload;wait")
   endif()
   e2e_host(output rc count @empty @empty run wait ${stop} exit)
-  # Each file untouched or marked, with its row but for the malformed and the empty example (Windows may end
-  # the thread between an insert and its rename: one row more).
+  # Each file untouched or marked, with its row but for the malformed and the empty example; one row more on Windows,
+  # whose exit may end the thread between an insert and its rename.
   file(GLOB_RECURSE all "${install}/*.eml")
   file(GLOB_RECURSE marked "${install}/PROC_*.eml")
   list(FILTER marked EXCLUDE REGEX "Alert_(malformed|empty)\\.eml$")
@@ -28,6 +27,6 @@ foreach(stop exit unload)
   list(LENGTH marked marked)
   math(EXPR extra "${rows} - ${marked}")
   if(NOT rc EQUAL 0 OR NOT all EQUAL 380 OR extra LESS 0 OR extra GREATER 0${WINDOWS})
-    e2e_fail("${stop} with the thread at work: exit ${rc}, ${output}; ${all} files, ${marked} marked with a row, ${rows} rows")
+    e2e_fail("${stop} mid-cycle: exit ${rc}, ${output}; ${all} files, ${marked} marked with a row, ${rows} rows")
   endif()
 endforeach()
