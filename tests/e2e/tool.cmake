@@ -57,15 +57,15 @@ expect_tool(0 "retention is off" purge ${in})
 expect_tool(0 "^added the index" optimize ${in})
 expect_tool(0 "\"when_index\": true" status ${in} --format json)
 expect_tool(0 "^removed the index" optimize ${in} --undo)
-set(late "${install}/Exchange/AlertReports/Outbox/late.eml")  # an alert that arrives late, written two hours ago
-execute_process(COMMAND touch -d "2 hours ago" "${late}")
+set(late "${install}/Exchange/AlertReports/Outbox/late")  # two late alerts, one written two hours ago
+execute_process(COMMAND touch -d "2 hours ago" "${late}1.eml" COMMAND touch "${late}2.eml")
 set_retention(TRUE "30 Days")
-expect(status 0 pending_total=1 database/exists=ON database/rows=36 database/schema_exact=ON database/when_index=OFF
+expect(status 0 pending_total=2 database/exists=ON database/rows=36 database/schema_exact=ON database/when_index=OFF
   database/quick_check=ok retention/enabled=ON "retention/days_text=30 Days" retention/days=30)
-if(NOT tool_out MATCHES "\"Exchange\",[^}]*\"Outbox\",[^}]*\"files\": 1,[^}]*\"oldest_age_s\": 7[0-9][0-9][0-9]\n")
-  e2e_fail("the late alert is not two hours old:\n${tool_out}")
+if(NOT tool_out MATCHES "\"Exchange\",[^}]*\"Outbox\",[^}]*\"files\": 2,[^}]*\"oldest_age_s\": 7[0-9][0-9][0-9]\n")
+  e2e_fail("the older late alert is not two hours old:\n${tool_out}")
 endif()
-file(REMOVE "${late}")
+file(REMOVE "${late}1.eml" "${late}2.eml")
 set(locked ON)
 expect_tool(0 "\"collector\": \"held\"" status ${in} --format json)
 expect_tool(4 "" collect --once ${in})
