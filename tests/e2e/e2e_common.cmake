@@ -31,6 +31,7 @@ set(install "${root}/install")
 set(E2E_SETTINGS "${root}/settings")
 file(REMOVE_RECURSE "${root}")
 file(MAKE_DIRECTORY "${install}")
+set(ENV{TZ} UTC)  # the expected When texts are UTC, also when the script runs outside ctest
 # At a script's top level: the library's debug log on and empty (or the test skipped), until e2e_log_end.
 macro(e2e_log_begin)
   if(NOT EXISTS "${E2E_LOG_DIR}")
