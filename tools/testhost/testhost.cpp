@@ -19,6 +19,9 @@
 // On Windows, `count` and `await` pass the filter and range as the service
 // does: its own string plus the by-value copy the export destroys.
 //   sleep MS        waits
+//   wait            reads one line from standard input: the test feeds it a line
+//                   when the condition it waits for holds (prints "wait gave up"
+//                   when the input ends first)
 //   unload          unloads the library
 //   exit            ends the process with exit(0) at once (static teardown runs)
 //
@@ -248,6 +251,9 @@ int main(int argc, char** argv) {
       std::printf("retention %d\n", retention());
     } else if (step == "sleep" && i + 1 < argc) {
       std::this_thread::sleep_for(std::chrono::milliseconds(std::atoi(argv[++i])));
+    } else if (step == "wait") {
+      char line[64];
+      if (std::fgets(line, sizeof line, stdin) == nullptr) std::printf("wait gave up\n");
     } else if (step == "unload") {
       Unload(module);
       module = nullptr;
