@@ -15,19 +15,12 @@
 namespace fs = std::filesystem;
 
 namespace asum::test {
-namespace {
 
-// Test programs never write into the service's own log folder: the
-// end-to-end tests switch it on and read it, and a cycle run by a test program
-// beside them would add its lines. A test that reads the log captures it.
-const bool kServiceLogOff = [] {
+// Test programs never write into the service's own log folder: the end-to-end
+// tests switch it on and read it. Dates in the tests are written for UTC; a
+// program run by hand, outside ctest, must not read them in the machine's zone.
+const bool kSetUp = [] {
   platform::SetLogFolder(u"");
-  return true;
-}();
-
-// Dates in the tests are written for UTC; a program run by hand, outside
-// ctest, must not read them in the machine's own zone.
-const bool kZoneIsUtc = [] {
 #ifdef _WIN32
   _putenv_s("TZ", "UTC");
   _tzset();
@@ -38,11 +31,6 @@ const bool kZoneIsUtc = [] {
   return true;
 }();
 
-fs::path ToPath(const std::u16string& p) { return fs::path(p); }
-std::u16string FromPath(const fs::path& p) { return p.u16string(); }
-
-}  // namespace
-
 std::string Narrow(std::u16string_view text) { return Utf16ToUtf8(text); }
 std::u16string U16(const std::string& utf8) { return Utf8ToUtf16(utf8); }
 
@@ -52,7 +40,7 @@ TempDir::TempDir() {
   fs::path p = fs::temp_directory_path() /
                ("asum-" + std::to_string(stamp) + "-" + std::to_string(counter.fetch_add(1)));
   fs::create_directories(p);
-  path_ = FromPath(fs::canonical(p));
+  path_ = fs::canonical(p).u16string();
 }
 
 TempDir::~TempDir() { RemoveTree(path_); }
@@ -63,41 +51,40 @@ std::u16string TempDir::Join(const std::u16string& relative) const {
 
 void MakeFolders(const std::u16string& path) {
   std::error_code ec;
-  fs::create_directories(ToPath(path), ec);
+  fs::create_directories(fs::path(path), ec);
 }
 
 void WriteText(const std::u16string& path, const std::string& bytes) {
-  MakeFolders(FromPath(ToPath(path).parent_path()));
-  std::ofstream out(ToPath(path), std::ios::binary | std::ios::trunc);
+  MakeFolders(fs::path(path).parent_path().u16string());
+  std::ofstream out(fs::path(path), std::ios::binary | std::ios::trunc);
   out.write(bytes.data(), static_cast<std::streamsize>(bytes.size()));
   ASSERT_TRUE(out.good()) << "cannot write " << Narrow(path);
 }
 
 std::string ReadText(const std::u16string& path) {
-  std::ifstream in(ToPath(path), std::ios::binary);
+  std::ifstream in(fs::path(path), std::ios::binary);
   return std::string(std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>());
 }
 
 void RemoveTree(const std::u16string& path) {
   std::error_code ec;
   // Read-only folders left by a test would stop the removal.
-  for (auto it = fs::recursive_directory_iterator(ToPath(path), ec); !ec && it != fs::recursive_directory_iterator();
+  for (auto it = fs::recursive_directory_iterator(fs::path(path), ec); !ec && it != fs::recursive_directory_iterator();
        it.increment(ec)) {
     fs::permissions(it->path(), fs::perms::owner_all, fs::perm_options::add, ec);
   }
-  fs::remove_all(ToPath(path), ec);
+  fs::remove_all(fs::path(path), ec);
 }
 
 std::vector<std::u16string> ListNames(const std::u16string& folder) {
   std::vector<std::u16string> names;
   std::error_code ec;
-  for (const auto& entry : fs::directory_iterator(ToPath(folder), ec)) names.push_back(entry.path().filename().u16string());
+  for (const auto& e : fs::directory_iterator(fs::path(folder), ec)) names.push_back(e.path().filename().u16string());
   std::sort(names.begin(), names.end());
   return names;
 }
 
 CapturedLog::CapturedLog() : previous_(platform::LogFolder()) { platform::SetLogFolder(dir_.path()); }
-
 CapturedLog::~CapturedLog() { platform::SetLogFolder(previous_); }
 
 std::vector<std::u16string> CapturedLog::Messages() const {
@@ -107,12 +94,10 @@ std::vector<std::u16string> CapturedLog::Messages() const {
   while (pos < text.size()) {
     size_t end = text.find("\r\n", pos);
     if (end == std::string::npos) end = text.size();
-    const std::string line = text.substr(pos, end - pos);
-    const size_t tab = line.find('\t');
-    const std::string message = tab == std::string::npos ? line : line.substr(tab + 1);
-    std::u16string wide(message.begin(), message.end());
-    for (char16_t& c : wide) c = static_cast<char16_t>(static_cast<unsigned char>(c));  // bytes are Latin-1
-    messages.push_back(wide);
+    const size_t tab = text.find('\t', pos);
+    std::u16string& message = messages.emplace_back();
+    // Past the timestamp's tab; the bytes are Latin-1.
+    for (size_t i = tab < end ? tab + 1 : pos; i < end; ++i) message += static_cast<unsigned char>(text[i]);
     pos = end + 2;
   }
   return messages;

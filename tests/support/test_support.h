@@ -1,5 +1,4 @@
-// Helpers shared by the test programs: temporary folders, files, and a log
-// folder of the test's own.
+// Helpers shared by the test programs: temporary folders, files, a log of the test's own.
 #pragma once
 
 #include <string>
@@ -9,8 +8,7 @@
 
 namespace asum::test {
 
-// A fresh folder under the system's temporary folder, removed with everything
-// in it when the object goes. Paths use the platform's separator.
+// A fresh temporary folder, removed with all it holds when the object goes.
 class TempDir {
  public:
   TempDir();
@@ -19,7 +17,7 @@ class TempDir {
   TempDir& operator=(const TempDir&) = delete;
 
   const std::u16string& path() const { return path_; }
-  // path() + separator + relative (relative may use '\' between elements).
+  // `relative` may use '\' between elements.
   std::u16string Join(const std::u16string& relative) const;
 
  private:
