@@ -46,7 +46,7 @@ OS_ALLOWED = {
     "tests/faults/fault_support.cpp": "tells Wine from Windows",
     "tests/faults/faults_test.cpp": "asks whether it runs as root",
     "tests/faults/hostile_test.cpp": "runs a cycle on a thread with a small stack",
-    "tests/store/store_test_support.cpp": "makes a database file unwritable, for root too",
+    "tests/store/retention_test.cpp": "makes a database file unwritable, for root too",
 }
 # Tests run callers against each other with the language's own threads.
 THREAD_ALLOWED = {"tests/": "runs callers against each other"}

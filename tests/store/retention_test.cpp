@@ -1,8 +1,19 @@
 #include "store/retention.h"
 
+#include <filesystem>
+#include <fstream>
 #include <map>
 #include <set>
+#ifdef _WIN32
+#include <windows.h>
+#else
+#include <fcntl.h>
+#include <linux/fs.h>
+#include <sys/ioctl.h>
+#include <unistd.h>
+#endif
 
+#include "store/alert_count.h"
 #include "store/host_queries.h"
 #include "store/retention_settings.h"
 #include "store_test_support.h"
@@ -11,6 +22,42 @@ namespace asum {
 namespace {
 
 using Texts = std::vector<std::u16string>;
+
+// Keeps everyone, root too, from writing a file while it lives: read-only
+// permissions, and where they do not bind, the immutable attribute (Linux) or
+// a handle that shares the file for reading alone (Windows).
+class UnwritableFile {
+ public:
+  explicit UnwritableFile(const std::u16string& path) : path_(path) {
+    std::filesystem::permissions(path_, std::filesystem::perms::owner_read);
+    if (!Unwritable()) locked_out_ = LockOut(true);
+  }
+  ~UnwritableFile() {
+    if (locked_out_) LockOut(false);
+    std::filesystem::permissions(path_, std::filesystem::perms::owner_all);
+  }
+  bool Unwritable() const { return !std::ofstream(path_, std::ios::app).good(); }
+
+ private:
+  bool LockOut(bool on) {
+#ifdef _WIN32
+    if (!on) return CloseHandle(handle_);
+    handle_ = CreateFileW(path_.c_str(), GENERIC_READ, FILE_SHARE_READ, nullptr, OPEN_EXISTING, 0, nullptr);
+    return handle_ != INVALID_HANDLE_VALUE;
+#else
+    const int fd = ::open(path_.c_str(), O_RDONLY);
+    int flags = 0;
+    bool ok = fd >= 0 && ::ioctl(fd, FS_IOC_GETFLAGS, &flags) == 0;
+    flags = on ? flags | FS_IMMUTABLE_FL : flags & ~FS_IMMUTABLE_FL;
+    ok = ok && ::ioctl(fd, FS_IOC_SETFLAGS, &flags) == 0;
+    if (fd >= 0) ::close(fd);
+    return ok;
+#endif
+  }
+  std::filesystem::path path_;
+  bool locked_out_ = false;
+  void* handle_ = nullptr;
+};
 
 TEST(RetentionDays, ReadsTheNumberAsWcstolDoes) {
   const std::pair<std::u16string, int32_t> cases[] = {
@@ -141,7 +188,8 @@ TEST_F(RetentionTest, ReadingForStatusCreatesNoKey) {
 }
 
 // No database yet: created with its table; an empty file: given the table;
-// a missing folder or a database locked past the allowance: 0, rows kept.
+// a missing folder, a database locked past the allowance or one nobody may
+// write (counted still): 0, rows kept.
 TEST_F(RetentionTest, PurgeOfAnUnusableDatabaseGivesZeroAndKeepsTheRows) {
   env_.SetSetting(u"Sch_Retention", u"TRUE");
   test::StoreDir fresh, empty;
@@ -152,6 +200,14 @@ TEST_F(RetentionTest, PurgeOfAnUnusableDatabaseGivesZeroAndKeepsTheRows) {
   ASSERT_EQ(other.Exec("BEGIN EXCLUSIVE"), SQLITE_OK);
   EXPECT_EQ(RunRetentionProc(dir_.install(), 20), 0);
   other.Exec("ROLLBACK");
+  EXPECT_EQ(dir_.Column().size(), kWhens.size());
+  UnwritableFile file(dir_.db_path());
+  if (!file.Unwritable()) {
+    GTEST_SKIP() << "neither read-only permissions nor the immutable attribute keep this user from writing here "
+                    "(chattr +i needs root and a file system that keeps it: ext2/3/4, XFS or Btrfs)";
+  }
+  EXPECT_EQ(CountAlerts(dir_.install(), u"", u"</FROM>"), 6) << "a read-only database is still counted";
+  EXPECT_EQ(RunRetentionProc(dir_.install(), 20), 0);
   EXPECT_EQ(dir_.Column().size(), kWhens.size());
 }
 
