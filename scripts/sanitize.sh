@@ -22,7 +22,8 @@ export ASAN_OPTIONS=halt_on_error=1:abort_on_error=1:print_stacktrace=1:detect_l
 export UBSAN_OPTIONS=halt_on_error=1:abort_on_error=1:print_stacktrace=1
 # The processing thread's objects are left allocated on purpose; see the file.
 export LSAN_OPTIONS=print_suppressions=0:suppressions=$PWD/tests/sanitizers/lsan.supp
-export TSAN_OPTIONS=halt_on_error=1:abort_on_error=1:second_deadlock_stack=1:history_size=4
+# glibc's own locale loading is suppressed; see the file.
+export TSAN_OPTIONS=halt_on_error=1:abort_on_error=1:second_deadlock_stack=1:history_size=4:suppressions=$PWD/tests/sanitizers/tsan.supp
 
 # The tests of the ThreadSanitizer build: all of test_entry (the processing
 # thread), and from the other programs the tests whose names say they run
