@@ -30,7 +30,7 @@ export TSAN_OPTIONS=halt_on_error=1:abort_on_error=1:second_deadlock_stack=1:his
 # threads against each other.
 tsan_labels='^entry$'
 tsan_other_labels='^(log|store|collect|faults)$'
-tsan_regex='Concurren|Stress|ProcessingThread'
+tsan_regex='Concurren|Stress|ProcessingThread|BusyBudget'
 
 step() { printf '\n=== %s\n' "$*"; }
 
