@@ -84,6 +84,9 @@ class TestEnv : public platform::Env {
     if (fault == Fault::kBeingWritten) return {platform::FileStatus::kSharingViolation, 32};
     return Env::ReadFile(path, bytes, max_bytes);
   }
+  platform::ThreadHandle StartThread(void (*fn)(void*), void* arg) override {
+    return ++threads, Env::StartThread(fn, arg);
+  }
   platform::FileResult RenameNoReplace(const std::u16string& from, const std::u16string& to) override {
     if (fault == Fault::kStopRename) stop->Request();
     if (fault == Fault::kRenameRefused) return {platform::FileStatus::kAccessDenied, 5};
@@ -93,6 +96,7 @@ class TestEnv : public platform::Env {
   }
 
   Fault fault = Fault::kNone;
+  int threads = 0;  // started through the environment
   const test::CapturedLog& log;
   platform::StopSignal* stop = nullptr;
   std::mutex mutex;
@@ -239,6 +243,7 @@ TEST_F(ProcessAlertFilesTest, WithTheLogOnEachFileIsReadOnTheProcessingThreadAft
   Process(u"On", {Message(), Message(), Message()});
   ASSERT_EQ(env_.reads.size(), 3u);
   for (std::ptrdiff_t k = 0; k < 3; ++k) EXPECT_EQ(env_.reads[k], std::make_pair(std::this_thread::get_id(), k));
+  EXPECT_EQ(env_.threads, 0) << "no reader ahead while the log is on";
   const std::u16string log_folder = platform::LogFolder();
   platform::SetLogFolder(log_folder + u"-absent");
   Process(u"Off", {Message(), Message(), Message(), Message(), Message()});
